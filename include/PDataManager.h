@@ -1,0 +1,28 @@
+#pragma once
+
+#include "ProxyComponent.h"
+
+class BData;
+class CDataManager;
+
+// Proxy of the data manager; every operation answers CDataManager's result codes, and
+// CDataManager::eNO_SUCH_DATA once the component is gone.
+class TESSEL_EXPORT PDataManager : public ProxyComponent
+{
+public:
+    explicit PDataManager(IComponent* component);
+    ~PDataManager() override;
+
+    void handleEvent(const EventDestroyingComponent& event) override;
+
+    int setData(const ID& uri, const BData& value);
+    int getData(const ID& uri, BData& value);
+    int setBool(const ID& uri, bool value);
+    int setString(const ID& uri, const ACE_WString& value);
+    int getString(const ID& uri, ACE_WString& value);
+    int getBool(const ID& uri, bool& value);
+    int createData(const ID& uri, const BData& value);
+
+private:
+    CDataManager* m_pComp;
+};

@@ -1,0 +1,68 @@
+#pragma once
+
+#include "Export.h"
+
+#include <ace/SString.h>
+
+#include <cstdarg>
+#include <functional>
+#include <string>
+
+// The framework's process-wide logger.
+//
+// Formats follow the original platform: in a wide format "%s" takes a wide string and "%S" a
+// narrow (UTF-8) one; in a narrow format "%s" takes a narrow string and "%S" a wide one.
+// Lines go to the log file named with setLogFile (if any) and to every registered sink.
+class TESSEL_EXPORT TesselLog_Static
+{
+public:
+    enum Level
+    {
+        eTRACE = 1,
+        eINFORMATION = 2,
+        eWARNING = 4,
+        eERROR = 16
+    };
+
+    struct Record
+    {
+        int level;
+        int code;
+        std::string component;
+        std::string file;
+        std::string className;
+        ACE_WString message;
+    };
+    using Sink = std::function<void(const Record&)>;
+
+    static void logTrace_static(const char* component, const char* file, const char* className,
+                                const wchar_t* message);
+    static void logInformation_static(const char* component, const char* file, const char* className,
+                                      const wchar_t* message);
+    static void logWarning_static(const char* component, const char* file, const char* className,
+                                  const wchar_t* message);
+    static void logError_static(const char* component, const char* file, const char* className, int code,
+                                const char* format, ...);
+    static void logError_static(const char* component, const char* file, const char* className, int code,
+                                const wchar_t* format, ...);
+    // Generic entry point: `level` is one of Level (16 failures, 1 tolerated conditions).
+    static void log_static(int level, int code, const char* component, const char* file,
+                           const char* className, const wchar_t* format, ...);
+
+    // Verbosity of the log file: 10 writes every line (recording mode), 0 only warnings and
+    // errors. Sinks always receive every line.
+    static void setLevel_static(int level);
+    static int getLevel_static();
+
+    // Appends lines to `path` (UTF-8); an empty path stops file logging.
+    static bool setLogFile(const ACE_WString& path);
+    static ACE_WString getLogFile();
+
+    // Sinks see every record, on the thread that logs. Returns a handle for removeSink.
+    static int addSink(Sink sink);
+    static void removeSink(int handle);
+};
+
+// Signature of TesselLog_Static::log_static, for modules that log through a pointer.
+using TesselLogFunction = void (*)(int level, int code, const char* component, const char* file,
+                                   const char* className, const wchar_t* format, ...);
