@@ -1,0 +1,16 @@
+#include "Win32Types.h"
+
+namespace
+{
+thread_local DWORD t_lastError = ERROR_SUCCESS;
+}
+
+DWORD GetLastError()
+{
+    return t_lastError;
+}
+
+void SetLastError(DWORD errorCode)
+{
+    t_lastError = errorCode;
+}
