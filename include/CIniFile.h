@@ -9,7 +9,9 @@
 
 typedef int EERRORCODE;
 
-// Read access to an ini file.
+// Read access to an ini file (UTF-8; sections and keys exactly as written in the file; the first
+// of repeated keys is the one read; keys before any section are in the section "").
+// openIniFile gives ePARSE_ERROR for a file with malformed lines; the well-formed ones can still be read.
 class TESSEL_EXPORT CIniFile
 {
 public:
