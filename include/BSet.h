@@ -4,6 +4,8 @@
 #include "StringSet.h"
 
 #include <memory>
+#include <string>
+#include <unordered_map>
 #include <utility>
 #include <vector>
 
@@ -48,6 +50,8 @@ public:
     const BData* find(const ACE_WString& key) const;
     // Stores a copy of `value` under `key`. 0 on success.
     int set(const ACE_WString& key, const BData& value);
+    // Stores `value` under `key`, taking ownership (no copy). 0 on success; eWRONG_TYPE for null.
+    int put(const ACE_WString& key, std::unique_ptr<BData> value);
 
     int getString(const ACE_WString& key, ACE_WString& value) const;
     int setString(const ACE_WString& key, const ACE_WString& value);
@@ -60,12 +64,17 @@ public:
     int getSet(const ACE_WString& key, BSet& value) const;
     int setSet(const ACE_WString& key, const BSet& value);
 
-    // Ordered access, for walking a set without copying it.
+    // Ordered access, for walking a set without copying it. Out of range gives an empty key
+    // and an empty string value.
     const ACE_WString& keyAt(int index) const;
     const BData& valueAt(int index) const;
 
 private:
     int indexOf(const ACE_WString& key) const;
 
+    void rebuildIndex();
+
     std::vector<std::pair<ACE_WString, std::unique_ptr<BData>>> m_entries;
+    // Key -> position in m_entries, so lookups stay fast in large sets.
+    std::unordered_map<std::wstring, int> m_index;
 };

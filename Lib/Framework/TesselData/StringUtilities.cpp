@@ -1,0 +1,404 @@
+#include "StringUtilities.h"
+
+#include "Utf8Codec.h"
+#include "WideString.h"
+
+#include <cstddef>
+#include <cstdint>
+#include <cstdio>
+#include <cwchar>
+#include <string>
+#include <sys/types.h>
+
+namespace
+{
+enum class Length
+{
+    eNONE,
+    eHH,
+    eH,
+    eL,
+    eLL,
+    eJ,
+    eZ,
+    eT,
+    eBIG_L
+};
+
+// One conversion spec, as read from the format.
+struct Spec
+{
+    std::string flags;
+    int width = -1;
+    int precision = -1;
+    Length length = Length::eNONE;
+    bool wideModifier = false;   // "l" or "w" on s/c
+    bool narrowModifier = false; // "h" on s/c
+};
+
+// Formats a single numeric conversion with the C library; never truncates.
+template <typename T>
+void appendNumber(std::wstring& out, const Spec& spec, const char* lengthText, char conversion, T value)
+{
+    std::string format = "%" + spec.flags;
+    if (spec.width >= 0)
+        format += std::to_string(spec.width);
+    if (spec.precision >= 0)
+        format += "." + std::to_string(spec.precision);
+    format += lengthText;
+    format += conversion;
+    const int needed = std::snprintf(nullptr, 0, format.c_str(), value);
+    if (needed <= 0)
+        return;
+    std::string buffer(static_cast<std::size_t>(needed) + 1, '\0');
+    std::snprintf(buffer.data(), buffer.size(), format.c_str(), value);
+    buffer.resize(static_cast<std::size_t>(needed));
+    for (char c : buffer)
+        out.push_back(static_cast<wchar_t>(static_cast<unsigned char>(c)));
+}
+
+// Pads `text` to the spec's width (in characters); "-" pads on the right.
+void appendPadded(std::wstring& out, const Spec& spec, const std::wstring& text)
+{
+    const std::size_t width = spec.width > 0 ? static_cast<std::size_t>(spec.width) : 0;
+    const std::size_t padding = text.size() < width ? width - text.size() : 0;
+    const bool left = spec.flags.find('-') != std::string::npos;
+    if (!left)
+        out.append(padding, L' ');
+    out += text;
+    if (left)
+        out.append(padding, L' ');
+}
+
+std::wstring wideArgument(const wchar_t* text, int precision)
+{
+    if (text == nullptr)
+        return precision < 0 || precision >= 6 ? L"(null)" : L"";
+    std::wstring result;
+    for (std::size_t i = 0; (precision < 0 || i < static_cast<std::size_t>(precision)) && text[i] != L'\0'; ++i)
+        result.push_back(text[i]);
+    return result;
+}
+
+std::wstring narrowArgument(const char* text, int precision)
+{
+    if (text == nullptr)
+        return precision < 0 || precision >= 6 ? L"(null)" : L"";
+    std::wstring result;
+    const char* p = text;
+    wchar_t c = 0;
+    while (precision < 0 || result.size() < static_cast<std::size_t>(precision))
+    {
+        const std::size_t used = Utf8Codec::decodeOne(p, nullptr, c);
+        if (used == 0)
+            break;
+        result.push_back(c);
+        p += used;
+    }
+    return result;
+}
+
+void appendLiteral(std::wstring& out, const wchar_t* begin, const wchar_t* end)
+{
+    out.append(begin, end);
+}
+
+void appendLiteral(std::wstring& out, const char* begin, const char* end)
+{
+    Utf8Codec::decode(begin, static_cast<std::size_t>(end - begin), out);
+}
+
+bool isDigit(wchar_t c)
+{
+    return c >= L'0' && c <= L'9';
+}
+
+// The shared formatter. `Char` is the format's own width: "%s" takes a string of that width and
+// "%S" one of the other width; "%ls"/"%ws" are always wide and "%hs" always narrow.
+template <typename Char>
+std::wstring formatWith(const Char* format, va_list args)
+{
+    std::wstring out;
+    if (format == nullptr)
+        return out;
+    constexpr bool wideFormat = sizeof(Char) == sizeof(wchar_t);
+    va_list ap;
+    va_copy(ap, args);
+    const Char* p = format;
+    while (*p != 0)
+    {
+        const Char* literal = p;
+        while (*p != 0 && *p != '%')
+            ++p;
+        appendLiteral(out, literal, p);
+        if (*p == 0)
+            break;
+        const Char* specStart = p;
+        ++p; // '%'
+        Spec spec;
+        while (*p == '-' || *p == '+' || *p == ' ' || *p == '#' || *p == '0' || *p == '\'')
+        {
+            if (spec.flags.find(static_cast<char>(*p)) == std::string::npos)
+                spec.flags.push_back(static_cast<char>(*p));
+            ++p;
+        }
+        if (*p == '*')
+        {
+            spec.width = va_arg(ap, int);
+            if (spec.width < 0)
+            {
+                spec.flags.push_back('-');
+                spec.width = -spec.width;
+            }
+            ++p;
+        }
+        else
+        {
+            while (isDigit(static_cast<wchar_t>(*p)))
+            {
+                spec.width = (spec.width < 0 ? 0 : spec.width) * 10 + static_cast<int>(*p - '0');
+                if (spec.width > 100000)
+                    spec.width = 100000;
+                ++p;
+            }
+        }
+        if (*p == '.')
+        {
+            ++p;
+            spec.precision = 0;
+            if (*p == '*')
+            {
+                spec.precision = va_arg(ap, int);
+                ++p;
+            }
+            else
+            {
+                while (isDigit(static_cast<wchar_t>(*p)))
+                {
+                    spec.precision = spec.precision * 10 + static_cast<int>(*p - '0');
+                    if (spec.precision > 100000)
+                        spec.precision = 100000;
+                    ++p;
+                }
+            }
+        }
+        // Length modifiers.
+        if (*p == 'h')
+        {
+            ++p;
+            spec.length = Length::eH;
+            spec.narrowModifier = true;
+            if (*p == 'h')
+            {
+                ++p;
+                spec.length = Length::eHH;
+            }
+        }
+        else if (*p == 'l')
+        {
+            ++p;
+            spec.length = Length::eL;
+            spec.wideModifier = true;
+            if (*p == 'l')
+            {
+                ++p;
+                spec.length = Length::eLL;
+            }
+        }
+        else if (*p == 'w')
+        {
+            ++p;
+            spec.wideModifier = true;
+        }
+        else if (*p == 'q' || *p == 'L')
+        {
+            spec.length = *p == 'q' ? Length::eLL : Length::eBIG_L;
+            ++p;
+        }
+        else if (*p == 'j' || *p == 'z' || *p == 't')
+        {
+            spec.length = *p == 'j' ? Length::eJ : (*p == 'z' ? Length::eZ : Length::eT);
+            ++p;
+        }
+        else if (*p == 'I')
+        {
+            if (p[1] == '6' && p[2] == '4')
+            {
+                spec.length = Length::eLL;
+                p += 3;
+            }
+            else if (p[1] == '3' && p[2] == '2')
+            {
+                p += 3;
+            }
+            else
+            {
+                spec.length = Length::eZ;
+                ++p;
+            }
+        }
+
+        const Char conversion = *p;
+        switch (conversion)
+        {
+        case 'd':
+        case 'i':
+            switch (spec.length)
+            {
+            case Length::eHH:
+                appendNumber(out, spec, "hh", 'd', static_cast<signed char>(va_arg(ap, int)));
+                break;
+            case Length::eH:
+                appendNumber(out, spec, "h", 'd', static_cast<short>(va_arg(ap, int)));
+                break;
+            case Length::eL:
+                appendNumber(out, spec, "l", 'd', va_arg(ap, long));
+                break;
+            case Length::eLL:
+                appendNumber(out, spec, "ll", 'd', va_arg(ap, long long));
+                break;
+            case Length::eJ:
+                appendNumber(out, spec, "j", 'd', va_arg(ap, intmax_t));
+                break;
+            case Length::eZ:
+                appendNumber(out, spec, "z", 'd', va_arg(ap, ssize_t));
+                break;
+            case Length::eT:
+                appendNumber(out, spec, "t", 'd', va_arg(ap, ptrdiff_t));
+                break;
+            default:
+                appendNumber(out, spec, "", 'd', va_arg(ap, int));
+                break;
+            }
+            break;
+        case 'u':
+        case 'x':
+        case 'X':
+        case 'o':
+        {
+            const char c = static_cast<char>(conversion);
+            switch (spec.length)
+            {
+            case Length::eHH:
+                appendNumber(out, spec, "hh", c, static_cast<unsigned char>(va_arg(ap, unsigned int)));
+                break;
+            case Length::eH:
+                appendNumber(out, spec, "h", c, static_cast<unsigned short>(va_arg(ap, unsigned int)));
+                break;
+            case Length::eL:
+                appendNumber(out, spec, "l", c, va_arg(ap, unsigned long));
+                break;
+            case Length::eLL:
+                appendNumber(out, spec, "ll", c, va_arg(ap, unsigned long long));
+                break;
+            case Length::eJ:
+                appendNumber(out, spec, "j", c, va_arg(ap, uintmax_t));
+                break;
+            case Length::eZ:
+                appendNumber(out, spec, "z", c, va_arg(ap, size_t));
+                break;
+            case Length::eT:
+                appendNumber(out, spec, "t", c, va_arg(ap, ptrdiff_t));
+                break;
+            default:
+                appendNumber(out, spec, "", c, va_arg(ap, unsigned int));
+                break;
+            }
+            break;
+        }
+        case 'f':
+        case 'F':
+        case 'e':
+        case 'E':
+        case 'g':
+        case 'G':
+        case 'a':
+        case 'A':
+            if (spec.length == Length::eBIG_L)
+                appendNumber(out, spec, "L", static_cast<char>(conversion), va_arg(ap, long double));
+            else
+                appendNumber(out, spec, "", static_cast<char>(conversion), va_arg(ap, double));
+            break;
+        case 'p':
+        {
+            Spec pointerSpec = spec;
+            pointerSpec.precision = -1;
+            appendNumber(out, pointerSpec, "", 'p', va_arg(ap, void*));
+            break;
+        }
+        case 's':
+        case 'S':
+        {
+            bool wide = (conversion == 's') == wideFormat;
+            if (spec.wideModifier)
+                wide = true;
+            else if (spec.narrowModifier)
+                wide = false;
+            if (wide)
+                appendPadded(out, spec, wideArgument(va_arg(ap, const wchar_t*), spec.precision));
+            else
+                appendPadded(out, spec, narrowArgument(va_arg(ap, const char*), spec.precision));
+            break;
+        }
+        case 'c':
+        case 'C':
+        {
+            bool wide = (conversion == 'c') == wideFormat;
+            if (spec.wideModifier)
+                wide = true;
+            else if (spec.narrowModifier)
+                wide = false;
+            wchar_t c = 0;
+            if (wide)
+                c = static_cast<wchar_t>(va_arg(ap, wint_t));
+            else
+            {
+                const auto byte = static_cast<unsigned char>(va_arg(ap, int));
+                c = byte < 0x80 ? static_cast<wchar_t>(byte) : Utf8Codec::kReplacement;
+            }
+            appendPadded(out, spec, std::wstring(1, c));
+            break;
+        }
+        case 'n':
+            // Never written to: the pointer is taken and ignored.
+            (void)va_arg(ap, void*);
+            break;
+        case '%':
+            out.push_back(L'%');
+            break;
+        default:
+            // Unknown conversion (or the end of the format): copied as written.
+            if (conversion == 0)
+            {
+                appendLiteral(out, specStart, p);
+                va_end(ap);
+                return out;
+            }
+            appendLiteral(out, specStart, p + 1);
+            break;
+        }
+        ++p;
+    }
+    va_end(ap);
+    return out;
+}
+}
+
+ACE_WString StringUtilities::wideSprintf(const wchar_t* format, ...)
+{
+    va_list args;
+    va_start(args, format);
+    ACE_WString result = wideVsprintf(format, args);
+    va_end(args);
+    return result;
+}
+
+ACE_WString StringUtilities::wideVsprintf(const wchar_t* format, va_list args)
+{
+    return WideString::fromStd(formatWith(format, args));
+}
+
+ACE_WString StringUtilities::narrowVsprintf(const char* format, va_list args)
+{
+    return WideString::fromStd(formatWith(format, args));
+}

@@ -1,0 +1,277 @@
+#include "TesselLog_Static.h"
+
+#include "StringUtilities.h"
+#include "WideString.h"
+
+#include <algorithm>
+#include <atomic>
+#include <chrono>
+#include <condition_variable>
+#include <cstdio>
+#include <ctime>
+#include <memory>
+#include <mutex>
+#include <thread>
+#include <vector>
+
+namespace
+{
+struct SinkEntry
+{
+    int handle = 0;
+    TesselLog_Static::Sink sink;
+    int activeCalls = 0; // guarded by the logger's mutex
+    std::atomic<bool> removed{false};
+};
+
+struct FileCloser
+{
+    void operator()(std::FILE* file) const { std::fclose(file); }
+};
+
+// The logger's process-wide state, behind one mutex.
+struct LoggerState
+{
+    std::mutex mutex;
+    std::condition_variable callsDone;
+    int level = 10;
+    ACE_WString path;
+    std::unique_ptr<std::FILE, FileCloser> file;
+    std::vector<std::shared_ptr<SinkEntry>> sinks;
+    int nextHandle = 1;
+};
+
+LoggerState& state()
+{
+    static LoggerState s_state;
+    return s_state;
+}
+
+// Sink calls this thread has taken on (pending or running), so a sink may log again or remove
+// sinks without waiting for itself.
+thread_local std::vector<SinkEntry*> t_held;
+thread_local std::size_t t_depth = 0;
+constexpr std::size_t kMaxSinkNesting = 4;
+constexpr int kRecordingLevel = 10;
+
+const char* levelName(int level)
+{
+    switch (level)
+    {
+    case TesselLog_Static::eTRACE:
+        return "TRACE";
+    case TesselLog_Static::eINFORMATION:
+        return "INFORMATION";
+    case TesselLog_Static::eWARNING:
+        return "WARNING";
+    case TesselLog_Static::eERROR:
+        return "ERROR";
+    default:
+        return nullptr;
+    }
+}
+
+std::string orDash(const std::string& text)
+{
+    return text.empty() ? std::string("-") : text;
+}
+
+std::string formatLine(const TesselLog_Static::Record& record)
+{
+    const auto now = std::chrono::system_clock::now();
+    const std::time_t seconds = std::chrono::system_clock::to_time_t(now);
+    const auto millis =
+        std::chrono::duration_cast<std::chrono::milliseconds>(now.time_since_epoch()).count() % 1000;
+    std::tm local{};
+    localtime_r(&seconds, &local);
+    char stamp[64];
+    std::snprintf(stamp, sizeof stamp, "%04d-%02d-%02d %02d:%02d:%02d.%03d", local.tm_year + 1900,
+                  local.tm_mon + 1, local.tm_mday, local.tm_hour, local.tm_min, local.tm_sec,
+                  static_cast<int>(millis));
+    const char* name = levelName(record.level);
+    std::string line = stamp;
+    line += ' ';
+    line += name != nullptr ? std::string(name) : "LEVEL" + std::to_string(record.level);
+    line += ' ' + orDash(record.component) + ' ' + orDash(record.file) + ' ' + orDash(record.className);
+    line += " [" + std::to_string(record.code) + "]: ";
+    line += WideString::toUtf8(record.message);
+    line += '\n';
+    return line;
+}
+
+bool passesVerbosity(int verbosity, int level)
+{
+    return verbosity >= kRecordingLevel || level >= TesselLog_Static::eWARNING;
+}
+
+std::string text(const char* value)
+{
+    return value != nullptr ? std::string(value) : std::string();
+}
+
+void dispatch(int level, int code, const char* component, const char* file, const char* className,
+              ACE_WString message)
+{
+    TesselLog_Static::Record record{level, code, text(component), text(file), text(className), std::move(message)};
+    LoggerState& s = state();
+    std::vector<std::shared_ptr<SinkEntry>> sinks;
+    {
+        std::lock_guard<std::mutex> lock(s.mutex);
+        if (s.file && passesVerbosity(s.level, level))
+        {
+            const std::string line = formatLine(record);
+            std::fwrite(line.data(), 1, line.size(), s.file.get());
+            std::fflush(s.file.get());
+        }
+        if (t_depth < kMaxSinkNesting)
+        {
+            sinks = s.sinks;
+            for (auto& entry : sinks)
+            {
+                ++entry->activeCalls;
+                t_held.push_back(entry.get());
+            }
+        }
+    }
+    // Sinks run outside the lock: they may log or remove sinks themselves.
+    for (auto& entry : sinks)
+    {
+        if (!entry->removed.load())
+        {
+            ++t_depth;
+            try
+            {
+                entry->sink(record);
+            }
+            catch (...)
+            {
+                // A failing sink must not stop the others or the caller.
+            }
+            --t_depth;
+        }
+        std::lock_guard<std::mutex> lock(s.mutex);
+        --entry->activeCalls;
+        t_held.erase(std::find(t_held.begin(), t_held.end(), entry.get()));
+        s.callsDone.notify_all();
+    }
+}
+
+ACE_WString messageText(const wchar_t* message)
+{
+    return message != nullptr ? ACE_WString(message) : ACE_WString(L"(null)");
+}
+}
+
+void TesselLog_Static::logTrace_static(const char* component, const char* file, const char* className,
+                                       const wchar_t* message)
+{
+    dispatch(eTRACE, 0, component, file, className, messageText(message));
+}
+
+void TesselLog_Static::logInformation_static(const char* component, const char* file, const char* className,
+                                             const wchar_t* message)
+{
+    dispatch(eINFORMATION, 0, component, file, className, messageText(message));
+}
+
+void TesselLog_Static::logWarning_static(const char* component, const char* file, const char* className,
+                                         const wchar_t* message)
+{
+    dispatch(eWARNING, 0, component, file, className, messageText(message));
+}
+
+void TesselLog_Static::logError_static(const char* component, const char* file, const char* className, int code,
+                                       const char* format, ...)
+{
+    va_list args;
+    va_start(args, format);
+    ACE_WString message = StringUtilities::narrowVsprintf(format, args);
+    va_end(args);
+    dispatch(eERROR, code, component, file, className, std::move(message));
+}
+
+void TesselLog_Static::logError_static(const char* component, const char* file, const char* className, int code,
+                                       const wchar_t* format, ...)
+{
+    va_list args;
+    va_start(args, format);
+    ACE_WString message = StringUtilities::wideVsprintf(format, args);
+    va_end(args);
+    dispatch(eERROR, code, component, file, className, std::move(message));
+}
+
+void TesselLog_Static::log_static(int level, int code, const char* component, const char* file,
+                                  const char* className, const wchar_t* format, ...)
+{
+    va_list args;
+    va_start(args, format);
+    ACE_WString message = StringUtilities::wideVsprintf(format, args);
+    va_end(args);
+    dispatch(level, code, component, file, className, std::move(message));
+}
+
+void TesselLog_Static::setLevel_static(int level)
+{
+    LoggerState& s = state();
+    std::lock_guard<std::mutex> lock(s.mutex);
+    s.level = level;
+}
+
+int TesselLog_Static::getLevel_static()
+{
+    LoggerState& s = state();
+    std::lock_guard<std::mutex> lock(s.mutex);
+    return s.level;
+}
+
+bool TesselLog_Static::setLogFile(const ACE_WString& path)
+{
+    LoggerState& s = state();
+    std::unique_ptr<std::FILE, FileCloser> opened;
+    if (path.length() != 0)
+    {
+        opened.reset(std::fopen(WideString::toUtf8(path).c_str(), "ae"));
+        if (!opened)
+            return false;
+    }
+    std::lock_guard<std::mutex> lock(s.mutex);
+    s.file = std::move(opened);
+    s.path = path;
+    return true;
+}
+
+ACE_WString TesselLog_Static::getLogFile()
+{
+    LoggerState& s = state();
+    std::lock_guard<std::mutex> lock(s.mutex);
+    return s.path;
+}
+
+int TesselLog_Static::addSink(Sink sink)
+{
+    if (!sink)
+        return 0;
+    LoggerState& s = state();
+    auto entry = std::make_shared<SinkEntry>();
+    entry->sink = std::move(sink);
+    std::lock_guard<std::mutex> lock(s.mutex);
+    entry->handle = s.nextHandle++;
+    s.sinks.push_back(entry);
+    return entry->handle;
+}
+
+void TesselLog_Static::removeSink(int handle)
+{
+    LoggerState& s = state();
+    std::unique_lock<std::mutex> lock(s.mutex);
+    const auto it = std::find_if(s.sinks.begin(), s.sinks.end(),
+                                 [handle](const std::shared_ptr<SinkEntry>& e) { return e->handle == handle; });
+    if (it == s.sinks.end())
+        return;
+    std::shared_ptr<SinkEntry> entry = *it;
+    s.sinks.erase(it);
+    entry->removed.store(true);
+    // Once removed, the sink is not called any more: wait for calls running on other threads.
+    const auto ownCalls = static_cast<int>(std::count(t_held.begin(), t_held.end(), entry.get()));
+    s.callsDone.wait(lock, [&] { return entry->activeCalls <= ownCalls; });
+}

@@ -1,0 +1,113 @@
+#include "Utf8Codec.h"
+
+#include <cstdint>
+
+std::size_t Utf8Codec::decodeOne(const char* p, const char* end, wchar_t& out)
+{
+    if (end != nullptr ? p >= end : *p == '\0')
+        return 0;
+    const auto lead = static_cast<unsigned char>(*p);
+    if (lead < 0x80)
+    {
+        out = static_cast<wchar_t>(lead);
+        return 1;
+    }
+    std::size_t count = 0;
+    std::uint32_t value = 0;
+    std::uint32_t minimum = 0;
+    if (lead >= 0xC2 && lead <= 0xDF)
+    {
+        count = 1;
+        value = lead & 0x1F;
+        minimum = 0x80;
+    }
+    else if (lead >= 0xE0 && lead <= 0xEF)
+    {
+        count = 2;
+        value = lead & 0x0F;
+        minimum = 0x800;
+    }
+    else if (lead >= 0xF0 && lead <= 0xF4)
+    {
+        count = 3;
+        value = lead & 0x07;
+        minimum = 0x10000;
+    }
+    else
+    {
+        out = kReplacement;
+        return 1;
+    }
+    for (std::size_t i = 1; i <= count; ++i)
+    {
+        // A NUL or any other non-continuation byte stops the sequence, so a terminated
+        // string is never read past its end.
+        if (end != nullptr && p + i >= end)
+        {
+            out = kReplacement;
+            return i;
+        }
+        const auto next = static_cast<unsigned char>(p[i]);
+        if ((next & 0xC0) != 0x80)
+        {
+            out = kReplacement;
+            return i;
+        }
+        value = (value << 6) | (next & 0x3F);
+    }
+    if (value < minimum || value > 0x10FFFF || (value >= 0xD800 && value <= 0xDFFF))
+        out = kReplacement;
+    else
+        out = static_cast<wchar_t>(value);
+    return count + 1;
+}
+
+void Utf8Codec::decode(const char* data, std::size_t size, std::wstring& out)
+{
+    out.reserve(out.size() + size);
+    const char* end = data + size;
+    const char* p = data;
+    wchar_t c = 0;
+    while (p < end)
+    {
+        const std::size_t used = decodeOne(p, end, c);
+        out.push_back(c);
+        p += used;
+    }
+}
+
+void Utf8Codec::encodeOne(wchar_t c, std::string& out)
+{
+    auto value = static_cast<std::uint32_t>(c);
+    if (value > 0x10FFFF || (value >= 0xD800 && value <= 0xDFFF))
+        value = kReplacement;
+    if (value < 0x80)
+    {
+        out.push_back(static_cast<char>(value));
+    }
+    else if (value < 0x800)
+    {
+        out.push_back(static_cast<char>(0xC0 | (value >> 6)));
+        out.push_back(static_cast<char>(0x80 | (value & 0x3F)));
+    }
+    else if (value < 0x10000)
+    {
+        out.push_back(static_cast<char>(0xE0 | (value >> 12)));
+        out.push_back(static_cast<char>(0x80 | ((value >> 6) & 0x3F)));
+        out.push_back(static_cast<char>(0x80 | (value & 0x3F)));
+    }
+    else
+    {
+        out.push_back(static_cast<char>(0xF0 | (value >> 18)));
+        out.push_back(static_cast<char>(0x80 | ((value >> 12) & 0x3F)));
+        out.push_back(static_cast<char>(0x80 | ((value >> 6) & 0x3F)));
+        out.push_back(static_cast<char>(0x80 | (value & 0x3F)));
+    }
+}
+
+void Utf8Codec::encode(const wchar_t* data, std::size_t size, std::string& out)
+{
+    out.reserve(out.size() + size);
+    for (std::size_t i = 0; i < size; ++i)
+        encodeOne(data[i], out);
+}

@@ -1,0 +1,20 @@
+#pragma once
+
+#include <cstddef>
+#include <string>
+
+// UTF-8 <-> UTF-32 (wchar_t) coding shared by the data library. Invalid input becomes U+FFFD.
+class Utf8Codec
+{
+public:
+    static constexpr wchar_t kReplacement = 0xFFFD;
+
+    // Decodes one character at `p`. `end` bounds the input; with a null `end` the input is
+    // NUL-terminated and decoding never reads past the terminator. Returns the bytes used (>= 1)
+    // or 0 at the end of the input.
+    static std::size_t decodeOne(const char* p, const char* end, wchar_t& out);
+    static void decode(const char* data, std::size_t size, std::wstring& out);
+    // Appends the UTF-8 form of `c`; surrogates and values above U+10FFFF give U+FFFD.
+    static void encodeOne(wchar_t c, std::string& out);
+    static void encode(const wchar_t* data, std::size_t size, std::string& out);
+};
