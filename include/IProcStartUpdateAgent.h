@@ -6,7 +6,8 @@
 class TESSEL_EXPORT IProcStartUpdateAgent
 {
 public:
-    enum _enum_CheckConfigurationPreparer
+    // Fixed to int: an agent may answer values outside the list, which callers map themselves.
+    enum _enum_CheckConfigurationPreparer : int
     {
         eOK = 0,
         eNOK_FAILED_INITIALIZE_LOG_SYSTEM = -1,
