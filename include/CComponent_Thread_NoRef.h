@@ -4,6 +4,8 @@
 
 #include <ace/SString.h>
 
+#include <atomic>
+
 // Common base of components: keeps the identifier and counts attached proxies.
 class TESSEL_EXPORT CComponent_Thread_NoRef : public IParameterizedComponent
 {
@@ -31,7 +33,7 @@ private:
     CComponent_Thread_NoRef& operator=(const CComponent_Thread_NoRef&) = delete;
 
     ID m_componentID;
-    int m_attachCount;
-    int m_proxyCount;
-    int m_referenceCount;
+    std::atomic<int> m_attachCount;
+    std::atomic<int> m_proxyCount;
+    std::atomic<int> m_referenceCount;
 };

@@ -3,6 +3,7 @@
 #include "ID.h"
 
 #include <functional>
+#include <memory>
 #include <string>
 
 // Process-wide table of event handlers, keyed by event type and identifier. BEvent<T> is
@@ -30,6 +31,10 @@ public:
 
 private:
     EventRegistry();
+    ~EventRegistry();
+    EventRegistry(const EventRegistry&) = delete;
+    EventRegistry& operator=(const EventRegistry&) = delete;
+
     struct Impl;
-    Impl* m_impl;
+    std::unique_ptr<Impl> m_impl;
 };

@@ -50,6 +50,11 @@ public:
 
     // Folder searched first for component libraries; empty: the dynamic linker's search path.
     virtual void setLibraryPath(const std::string& folder) = 0;
+
+    // Proxies handed out and not yet given back.
+    virtual int getLiveProxyCount() const = 0;
+    // True while the component is registered or made and not destroyed.
+    virtual bool hasComponent(const ID& id) const = 0;
 };
 
 // Signatures of the entry points of a component library.

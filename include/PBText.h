@@ -2,6 +2,8 @@
 
 #include "ProxyComponent.h"
 
+#include <atomic>
+
 class CBText;
 
 // Proxy of the text component; once the component is gone every text is the default text.
@@ -17,5 +19,5 @@ public:
     ACE_WString getText(int textId, const ACE_WString& defaultText);
 
 private:
-    CBText* m_pComp;
+    std::atomic<CBText*> m_pComp;
 };

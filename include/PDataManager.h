@@ -2,6 +2,8 @@
 
 #include "ProxyComponent.h"
 
+#include <atomic>
+
 class BData;
 class CDataManager;
 
@@ -24,5 +26,5 @@ public:
     int createData(const ID& uri, const BData& value);
 
 private:
-    CDataManager* m_pComp;
+    std::atomic<CDataManager*> m_pComp;
 };

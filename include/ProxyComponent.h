@@ -6,6 +6,8 @@
 
 #include <ace/Copy_Disabled.h>
 
+#include <atomic>
+
 // Base of every proxy: the only way one component reaches another. It remembers the
 // identifier of the component it serves; the component manager sends it
 // EventDestroyingComponent before that component goes away.
@@ -24,6 +26,6 @@ public:
     IComponent* component() const;
 
 private:
-    IComponent* m_component;
+    std::atomic<IComponent*> m_component;
     ID m_componentID;
 };

@@ -1,0 +1,3 @@
+#include "IControllerFactoryBase.h"
+
+IControllerFactoryBase::~IControllerFactoryBase() = default;

@@ -1,0 +1,7 @@
+#include "PControllerFactoryBase.h"
+
+PControllerFactoryBase::PControllerFactoryBase(IComponent* component) : ProxyComponent(component)
+{
+}
+
+PControllerFactoryBase::~PControllerFactoryBase() = default;

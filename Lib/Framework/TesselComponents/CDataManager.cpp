@@ -1,0 +1,364 @@
+#include "CDataManager.h"
+
+#include "BBool.h"
+#include "BString.h"
+#include "IComponentManager.h"
+#include "PDataManager.h"
+#include "TesselLog_Static.h"
+#include "WideString.h"
+
+#include <map>
+#include <mutex>
+#include <string>
+#include <utility>
+#include <vector>
+
+namespace
+{
+const char* const kComponent = "tesselComponents";
+const char* const kFile = "tesselComponents.dll";
+const char* const kClass = "CDataManager";
+
+// One value of the tree: a leaf holds a typed value, a set node (no value) holds children in
+// the order they were first written.
+struct Node
+{
+    std::unique_ptr<BData> value;
+    std::vector<std::pair<ACE_WString, std::unique_ptr<Node>>> children;
+
+    bool isSet() const { return value == nullptr; }
+
+    Node* child(const ACE_WString& key) const
+    {
+        for (const auto& [name, node] : children)
+            if (name == key)
+                return node.get();
+        return nullptr;
+    }
+
+    // The slot for `key`, appended empty when absent.
+    std::unique_ptr<Node>& slot(const ACE_WString& key)
+    {
+        for (auto& [name, node] : children)
+            if (name == key)
+                return node;
+        children.emplace_back(key, nullptr);
+        return children.back().second;
+    }
+
+    bool removeChild(const ACE_WString& key)
+    {
+        for (auto it = children.begin(); it != children.end(); ++it)
+        {
+            if (it->first == key)
+            {
+                children.erase(it);
+                return true;
+            }
+        }
+        return false;
+    }
+};
+
+std::unique_ptr<Node> nodeFrom(const BData& data)
+{
+    auto node = std::make_unique<Node>();
+    if (data.type() != BData::eSET)
+    {
+        node->value = data.clone();
+        return node;
+    }
+    const BSet& set = static_cast<const BSet&>(data);
+    for (int i = 0; i < set.size(); ++i)
+        node->children.emplace_back(set.keyAt(i), nodeFrom(set.valueAt(i)));
+    return node;
+}
+
+void fillSet(const Node& node, BSet& set)
+{
+    for (const auto& [name, child] : node.children)
+    {
+        if (child->isSet())
+        {
+            BSet inner;
+            fillSet(*child, inner);
+            set.setSet(name, inner);
+        }
+        else
+        {
+            set.set(name, *child->value);
+        }
+    }
+}
+
+// Writes `source` into the set node `target`: nested sets meet key by key, anything else replaces.
+void merge(Node& target, const BSet& source)
+{
+    for (int i = 0; i < source.size(); ++i)
+    {
+        const BData& value = source.valueAt(i);
+        std::unique_ptr<Node>& slot = target.slot(source.keyAt(i));
+        if (value.type() == BData::eSET && slot != nullptr && slot->isSet())
+            merge(*slot, static_cast<const BSet&>(value));
+        else
+            slot = nodeFrom(value);
+    }
+}
+
+bool isDataUri(const ID& uri)
+{
+    return uri.getScheme() == ACE_WString(L"data");
+}
+
+// The path segments of a "data:" identifier; empty segments are skipped.
+std::vector<ACE_WString> segmentsOf(const ID& uri)
+{
+    std::vector<ACE_WString> segments;
+    const std::wstring path = WideString::toStd(uri.getPath());
+    std::wstring::size_type start = 0;
+    while (start <= path.size())
+    {
+        std::wstring::size_type end = path.find(L'/', start);
+        if (end == std::wstring::npos)
+            end = path.size();
+        if (end > start)
+            segments.push_back(WideString::fromStd(path.substr(start, end - start)));
+        start = end + 1;
+    }
+    return segments;
+}
+
+void logNotDataUri(const char* operation, const ID& uri)
+{
+    TesselLog_Static::logError_static(kComponent, kFile, kClass, CDataManager::eNOT_A_DATA_URI,
+                                      "[CDataManager::%s()] '%S' is not a data URI", operation,
+                                      uri.getString().c_str());
+}
+}
+
+struct CDataManager::Impl
+{
+    // The node at `segments`, or null.
+    const Node* find(const std::vector<ACE_WString>& segments) const
+    {
+        const Node* node = &root;
+        for (const ACE_WString& segment : segments)
+        {
+            if (!node->isSet())
+                return nullptr;
+            node = node->child(segment);
+            if (node == nullptr)
+                return nullptr;
+        }
+        return node;
+    }
+
+    // The set node holding the last segment; made on the way (replacing values) when `create`.
+    Node* parentOf(const std::vector<ACE_WString>& segments, bool create)
+    {
+        Node* node = &root;
+        for (size_t i = 0; i + 1 < segments.size(); ++i)
+        {
+            if (!create)
+            {
+                Node* next = node->child(segments[i]);
+                if (next == nullptr || !next->isSet())
+                    return nullptr;
+                node = next;
+                continue;
+            }
+            std::unique_ptr<Node>& slot = node->slot(segments[i]);
+            if (slot == nullptr || !slot->isSet())
+                slot = std::make_unique<Node>();
+            node = slot.get();
+        }
+        return node;
+    }
+
+    void notify(const ID& uri)
+    {
+        std::vector<Listener> toCall;
+        {
+            std::lock_guard<std::mutex> lock(listenerMutex);
+            for (const auto& [handle, listener] : listeners)
+                toCall.push_back(listener);
+        }
+        for (const Listener& listener : toCall)
+            listener(uri);
+    }
+
+    mutable std::mutex mutex;
+    Node root;
+
+    std::mutex listenerMutex;
+    std::map<int, Listener> listeners;
+    int nextListener = 1;
+};
+
+const wchar_t* const CDataManager::componentID = L"tessel:DM?DataManager";
+
+CDataManager::CDataManager() : CComponent_Thread_NoRef(ID(componentID)), m_impl(std::make_unique<Impl>())
+{
+}
+
+CDataManager::~CDataManager() = default;
+
+CDataManager* CDataManager::registerWith(IComponentManager& manager)
+{
+    auto component = std::make_unique<CDataManager>();
+    CDataManager* registered = component.get();
+    const int result = manager.registerComponent(std::move(component),
+                                                 [](IComponent* served) { return new PDataManager(served); });
+    return result == 0 ? registered : nullptr;
+}
+
+int CDataManager::createData(const ID& uri, const BData& value)
+{
+    const std::vector<ACE_WString> segments = segmentsOf(uri);
+    if (!isDataUri(uri) || segments.empty())
+    {
+        logNotDataUri("createData", uri);
+        return eNOT_A_DATA_URI;
+    }
+    {
+        std::lock_guard<std::mutex> lock(m_impl->mutex);
+        Node* parent = m_impl->parentOf(segments, true);
+        parent->slot(segments.back()) = nodeFrom(value);
+    }
+    m_impl->notify(uri);
+    return eOK;
+}
+
+int CDataManager::setData(const ID& uri, const BData& value)
+{
+    const std::vector<ACE_WString> segments = segmentsOf(uri);
+    if (!isDataUri(uri) || segments.empty())
+    {
+        logNotDataUri("setData", uri);
+        return eNOT_A_DATA_URI;
+    }
+    {
+        std::lock_guard<std::mutex> lock(m_impl->mutex);
+        Node* parent = m_impl->parentOf(segments, false);
+        if (parent == nullptr || parent->child(segments.back()) == nullptr)
+            return eNO_SUCH_DATA;
+        parent->slot(segments.back()) = nodeFrom(value);
+    }
+    m_impl->notify(uri);
+    return eOK;
+}
+
+int CDataManager::getData(const ID& uri, BData& value) const
+{
+    if (!isDataUri(uri))
+    {
+        logNotDataUri("getData", uri);
+        return eNOT_A_DATA_URI;
+    }
+    const std::vector<ACE_WString> segments = segmentsOf(uri);
+    std::lock_guard<std::mutex> lock(m_impl->mutex);
+    const Node* node = m_impl->find(segments);
+    if (node == nullptr)
+        return eNO_SUCH_DATA;
+    if (!node->isSet())
+        return value.assign(*node->value) ? eOK : eWRONG_TYPE;
+    if (value.type() != BData::eSET)
+        return eWRONG_TYPE;
+    BSet set;
+    fillSet(*node, set);
+    static_cast<BSet&>(value) = std::move(set);
+    return eOK;
+}
+
+int CDataManager::setBool(const ID& uri, bool value)
+{
+    return createData(uri, BBool(value));
+}
+
+int CDataManager::getBool(const ID& uri, bool& value) const
+{
+    BBool read;
+    const int result = getData(uri, read);
+    if (result == eOK)
+        value = read.value();
+    return result;
+}
+
+int CDataManager::setString(const ID& uri, const ACE_WString& value)
+{
+    return createData(uri, BString(value));
+}
+
+int CDataManager::getString(const ID& uri, ACE_WString& value) const
+{
+    BString read;
+    const int result = getData(uri, read);
+    if (result == eOK)
+        value = read.value();
+    return result;
+}
+
+int CDataManager::removeData(const ID& uri)
+{
+    const std::vector<ACE_WString> segments = segmentsOf(uri);
+    if (!isDataUri(uri) || segments.empty())
+    {
+        logNotDataUri("removeData", uri);
+        return eNOT_A_DATA_URI;
+    }
+    {
+        std::lock_guard<std::mutex> lock(m_impl->mutex);
+        Node* parent = m_impl->parentOf(segments, false);
+        if (parent == nullptr || !parent->removeChild(segments.back()))
+            return eNO_SUCH_DATA;
+    }
+    m_impl->notify(uri);
+    return eOK;
+}
+
+bool CDataManager::preload(const ACE_WString& path, const ID& rootUri)
+{
+    if (!isDataUri(rootUri))
+    {
+        logNotDataUri("preload", rootUri);
+        return false;
+    }
+    BSet loaded;
+    if (!loaded.load(path))
+    {
+        TesselLog_Static::logError_static(kComponent, kFile, kClass, 0, "[CDataManager::preload()] cannot read '%S'",
+                                          path.c_str());
+        return false;
+    }
+    const std::vector<ACE_WString> segments = segmentsOf(rootUri);
+    {
+        std::lock_guard<std::mutex> lock(m_impl->mutex);
+        Node* target = &m_impl->root;
+        if (!segments.empty())
+        {
+            std::unique_ptr<Node>& slot = m_impl->parentOf(segments, true)->slot(segments.back());
+            if (slot == nullptr || !slot->isSet())
+                slot = std::make_unique<Node>();
+            target = slot.get();
+        }
+        merge(*target, loaded);
+    }
+    m_impl->notify(rootUri);
+    return true;
+}
+
+int CDataManager::addListener(Listener listener)
+{
+    if (!listener)
+        return 0;
+    std::lock_guard<std::mutex> lock(m_impl->listenerMutex);
+    const int handle = m_impl->nextListener++;
+    m_impl->listeners.emplace(handle, std::move(listener));
+    return handle;
+}
+
+void CDataManager::removeListener(int handle)
+{
+    std::lock_guard<std::mutex> lock(m_impl->listenerMutex);
+    m_impl->listeners.erase(handle);
+}

@@ -1,0 +1,59 @@
+#include "PDataManager.h"
+
+#include "CDataManager.h"
+
+PDataManager::PDataManager(IComponent* component)
+    : ProxyComponent(component), m_pComp(dynamic_cast<CDataManager*>(component))
+{
+}
+
+PDataManager::~PDataManager() = default;
+
+void PDataManager::handleEvent(const EventDestroyingComponent& event)
+{
+    if (event.getComponentID() == getID())
+        m_pComp = nullptr;
+    ProxyComponent::handleEvent(event);
+}
+
+int PDataManager::setData(const ID& uri, const BData& value)
+{
+    CDataManager* component = m_pComp.load();
+    return component != nullptr ? component->setData(uri, value) : CDataManager::eNO_SUCH_DATA;
+}
+
+int PDataManager::getData(const ID& uri, BData& value)
+{
+    CDataManager* component = m_pComp.load();
+    return component != nullptr ? component->getData(uri, value) : CDataManager::eNO_SUCH_DATA;
+}
+
+int PDataManager::setBool(const ID& uri, bool value)
+{
+    CDataManager* component = m_pComp.load();
+    return component != nullptr ? component->setBool(uri, value) : CDataManager::eNO_SUCH_DATA;
+}
+
+int PDataManager::setString(const ID& uri, const ACE_WString& value)
+{
+    CDataManager* component = m_pComp.load();
+    return component != nullptr ? component->setString(uri, value) : CDataManager::eNO_SUCH_DATA;
+}
+
+int PDataManager::getString(const ID& uri, ACE_WString& value)
+{
+    CDataManager* component = m_pComp.load();
+    return component != nullptr ? component->getString(uri, value) : CDataManager::eNO_SUCH_DATA;
+}
+
+int PDataManager::getBool(const ID& uri, bool& value)
+{
+    CDataManager* component = m_pComp.load();
+    return component != nullptr ? component->getBool(uri, value) : CDataManager::eNO_SUCH_DATA;
+}
+
+int PDataManager::createData(const ID& uri, const BData& value)
+{
+    CDataManager* component = m_pComp.load();
+    return component != nullptr ? component->createData(uri, value) : CDataManager::eNO_SUCH_DATA;
+}

@@ -1,0 +1,3 @@
+#include "IComponent.h"
+
+IComponent::~IComponent() = default;

@@ -1,0 +1,3 @@
+#include "IComponentManager.h"
+
+IComponentManager::~IComponentManager() = default;

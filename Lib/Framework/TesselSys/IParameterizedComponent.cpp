@@ -1,0 +1,3 @@
+#include "IParameterizedComponent.h"
+
+IParameterizedComponent::~IParameterizedComponent() = default;
