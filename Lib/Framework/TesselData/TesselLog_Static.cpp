@@ -11,6 +11,7 @@
 #include <ctime>
 #include <memory>
 #include <mutex>
+#include <new>
 #include <thread>
 #include <vector>
 
@@ -41,10 +42,22 @@ struct LoggerState
     int nextHandle = 1;
 };
 
+// Built on first use and never destroyed, so objects that log from their destructors at exit
+// still find the logger (lines are flushed as they are written).
+class ImmortalLoggerState
+{
+public:
+    ImmortalLoggerState() { new (m_storage) LoggerState(); }
+    LoggerState& get() { return *std::launder(reinterpret_cast<LoggerState*>(m_storage)); }
+
+private:
+    alignas(LoggerState) unsigned char m_storage[sizeof(LoggerState)];
+};
+
 LoggerState& state()
 {
-    static LoggerState s_state;
-    return s_state;
+    static ImmortalLoggerState s_state;
+    return s_state.get();
 }
 
 // Sink calls this thread has taken on (pending or running), so a sink may log again or remove

@@ -16,6 +16,11 @@ struct IDCase
     const char* path;
 };
 
+void PrintTo(const IDCase& c, std::ostream* out)
+{
+    *out << '"' << c.text << '"';
+}
+
 std::string u8(const ACE_WString& text)
 {
     return WideString::toUtf8(text);

@@ -37,7 +37,7 @@ BSet sampleSet()
     set.setString(L"spaces", L"  lead and trail  ");
     set.setString(L"blank", L" \t ");
     set.setString(L"lines", L"one\ntwo\r\nthree\r");
-    set.setString(L"markup", L"<a href=\"x\">&amp; 'q'</a> ]]>");
+    set.setString(L"markup", L"<a href=\"x\">&amp; 'q'</a> ]]> \x01\x1f\x7f");
     set.setString(L"k\u00e9y <&> \"q\" \t\n", L"odd key");
     set.setInt(L"min", std::numeric_limits<long>::min());
     set.setInt(L"max", std::numeric_limits<long>::max());
@@ -121,6 +121,11 @@ struct BadFile
     const char* name;
     std::string content;
 };
+
+void PrintTo(const BadFile& file, std::ostream* out)
+{
+    *out << file.name;
+}
 
 class XmlBadFile : public ::testing::TestWithParam<BadFile>
 {
