@@ -149,13 +149,22 @@ TEST_F(Logger, RemovedSinkIsNeverCalledAgainWhileOthersLog)
             while (!stop.load())
                 TesselLog_Static::logTrace_static("c", "f", "k", L"busy");
         });
-    for (int round = 0; round < 200; ++round)
+    for (int round = 0; round < 100; ++round)
     {
         std::atomic<int> calls{0};
-        const int handle = TesselLog_Static::addSink([&calls](const TesselLog_Static::Record&) { ++calls; });
+        std::atomic<int> inside{0};
+        const int handle = TesselLog_Static::addSink([&](const TesselLog_Static::Record&) {
+            ++inside;
+            ++calls;
+            for (int i = 0; i < 200; ++i) // stay a while, so removal often meets a running call
+                std::this_thread::yield();
+            --inside;
+        });
         while (calls.load() == 0)
             std::this_thread::yield();
         TesselLog_Static::removeSink(handle);
+        // Removal waits for running calls, and no call starts after it.
+        ASSERT_EQ(inside.load(), 0) << "round " << round;
         const int afterRemoval = calls.load();
         TesselLog_Static::logTrace_static("c", "f", "k", L"after");
         ASSERT_EQ(calls.load(), afterRemoval) << "round " << round;
