@@ -58,7 +58,6 @@ int main(int argc, char** argv)
     CDataManager::registerWith(*manager);
     CBText::registerWith(*manager);
 
-    int failures = 0;
     {
         SmartProxy<PControllerFactoryBase> factory;
         if (!factory.acquire(ID(kFactoryID)))
@@ -78,5 +77,5 @@ int main(int argc, char** argv)
                 std::printf("  %-24s -> none\n", text.c_str());
         }
     }
-    return failures;
+    return 0;
 }

@@ -50,7 +50,7 @@ TEST_P(EntryPointTest, OnlyTheFactoryQueryMakesAComponentAndAProxy)
     std::unique_ptr<IComponent> component(createComponent(id));
     EXPECT_EQ(component != nullptr, GetParam().matches);
 
-    CToolConfigControllersFactory reference(ID(kFactoryID));
+    CToolConfigControllersFactory reference{ID(kFactoryID)};
     std::unique_ptr<ProxyComponent> proxy(createProxy(id, &reference));
     EXPECT_EQ(proxy != nullptr, GetParam().matches);
 }
