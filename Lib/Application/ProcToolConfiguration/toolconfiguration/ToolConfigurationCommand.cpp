@@ -1,0 +1,746 @@
+#include "ToolConfigurationCommand.h"
+
+#include "BBool.h"
+#include "BInt.h"
+#include "BOStream.h"
+#include "BString.h"
+#include "CIniFile.h"
+#include "CLogsZipperGui.h"
+#include "StringSet.h"
+#include "StringUtilities.h"
+#include "TesselLog_Static.h"
+#include "UpdateUpdater.h"
+#include "UsersUpdater.h"
+#include "WorkshopInfoUpdater.h"
+
+#include <ace/Guard_T.h>
+#include <ace/OS_NS_stdlib.h>
+
+#include <QEvent>
+
+#include <algorithm>
+#include <string>
+#include <vector>
+
+namespace
+{
+const char* const kComponent = "ProcToolConfiguration";
+const char* const kFile = "ProcToolConfiguration.dll";
+const char* const kClass = "ToolConfigurationCommand";
+
+const int kFileChangedEvent = 668;
+const long kStateEditable = 3;
+const long kStateFixed = 2;
+const long kStateDisplayOnly = 19;
+
+const wchar_t* const kControlUriFormat = L"data:/Auto/SystemMenu/%s";
+const wchar_t* const kActivePreparateur = L"ActivePreparateur";
+
+const wchar_t* const kUsersFileDefault = L"../../Data/User/FicheDiagParams.xml";
+const wchar_t* const kUsersFileUri = L"data:/Configuration/DoC/FicheDiagnostic/FicheDiagParamsFileName";
+const wchar_t* const kWorkshopFileDefault = L"../../Data/User/InformationsGarage.xml";
+const wchar_t* const kWorkshopFileUri = L"data:/Configuration/MenuBar/WorkshopFile";
+const wchar_t* const kUpdateFileDefault = L"../../Data/User/OnLineUpdate/Preparateur.xml";
+const wchar_t* const kUpdateFileUri = L"data:/Configuration/MenuBar/PreparateurConfigFile";
+const wchar_t* const kIniFileUri = L"data:/Configuration/MarvaneNet/Applet/ConfHF";
+const wchar_t* const kBrandsUri = L"data:/Configuration/DoC/Config_Accueil/Brands";
+
+const wchar_t* const kDataManagerID = L"tessel:DM?DataManager";
+const wchar_t* const kBTextID = L"tessel:BText?BText";
+const wchar_t* const kMessageBoxManagerID = L"tessel:Navigation?MessageBoxManager";
+const wchar_t* const kUpdateAgentID = L"proc:ProcStartUpdateAgent?ProcStartUpdateAgent";
+const wchar_t* const kWatcherID = L"util:FileSystemUtilities?CQ17FileSystemWatcher";
+
+void trace(const wchar_t* message)
+{
+    TesselLog_Static::logTrace_static(kComponent, kFile, kClass, message);
+}
+
+void warning(const wchar_t* message)
+{
+    TesselLog_Static::logWarning_static(kComponent, kFile, kClass, message);
+}
+
+ID controlUri(const ACE_WString& name)
+{
+    return ID(StringUtilities::wideSprintf(kControlUriFormat, name.c_str()));
+}
+
+ACE_WString toWide(const QString& text)
+{
+    const std::wstring wide = text.toStdWString();
+    return ACE_WString(wide.c_str(), wide.size());
+}
+
+QString toQString(const ACE_WString& text)
+{
+    return QString::fromWCharArray(text.c_str(), static_cast<qsizetype>(text.length()));
+}
+
+// The brand number right-justified to four characters with '0'; longer keys stay as they are.
+ACE_WString padBrandKey(const ACE_WString& key)
+{
+    ACE_WString padded;
+    for (size_t i = key.length(); i < 4; ++i)
+        padded += L'0';
+    padded += key;
+    return padded;
+}
+
+// An edit record: { "state": state, "value": { "item": text } }.
+BSet makeEditRecord(long state, const ACE_WString& text)
+{
+    BSet record(10);
+    record.set(L"state", BInt(state));
+    BSet value(10);
+    value.set(L"item", BString(text));
+    record.set(L"value", value);
+    return record;
+}
+
+// A two-edit record: { "state": 3, "edit1": first, "edit2": second }.
+BSet makeTwoEditRecord(const ACE_WString& edit1Text, const ACE_WString& edit2Text)
+{
+    BSet record(10);
+    record.set(L"state", BInt(kStateEditable));
+    record.set(L"edit1", BString(edit1Text));
+    record.set(L"edit2", BString(edit2Text));
+    return record;
+}
+}
+
+const ID ToolConfigurationCommand::m_ID(L"processing:ProcToolConfiguration?ToolConfigurationCommand");
+
+ToolConfigurationCommand::ToolConfigurationCommand(const QString& commandID)
+    : WidgetCommandBase(commandID),
+      Handler<CustomEvent>(),
+      m_pWorkshopInfoUpdater(nullptr),
+      m_pUsersUpdater(nullptr),
+      m_pUpdateUpdater(nullptr),
+      m_messageBoxManager(),
+      m_bText(),
+      m_procStartUpdateAgent(),
+      m_dataManager(),
+      m_bRecordingMode(false),
+      m_app2AppIP(),
+      m_app2AppValues(10),
+      m_storesMutex(),
+      m_fileSystemWatcher()
+{
+    m_dataManager.acquire(ID(kDataManagerID));
+    m_fileSystemWatcher.acquire(ID(kWatcherID));
+    trace(L"[ToolConfigurationCommand::ToolConfigurationCommand] : Constructor started");
+    createDMData(false);
+}
+
+ToolConfigurationCommand::~ToolConfigurationCommand()
+{
+    trace(L"[ToolConfigurationCommand::~ToolConfigurationCommand] : Destructor started");
+    if (unregister(m_ID) != 0)
+        warning(L"[ToolConfigurationCommand::~ToolConfigurationCommand] : Failed to unregister for CustomEvent.");
+
+    ACE_Guard<ACE_Thread_Mutex> guard(m_storesMutex);
+    delete m_pWorkshopInfoUpdater;
+    m_pWorkshopInfoUpdater = nullptr;
+    delete m_pUsersUpdater;
+    m_pUsersUpdater = nullptr;
+    delete m_pUpdateUpdater;
+    m_pUpdateUpdater = nullptr;
+}
+
+bool ToolConfigurationCommand::init()
+{
+    trace(L"[ToolConfigurationCommand::init] : Method started");
+
+    if (!m_fileSystemWatcher.isAvailable())
+    {
+        warning(L"[ToolConfigurationCommand::init()] : Failed to get proxy to Q17FilSystemWatcher.");
+        return false;
+    }
+    if (Register(m_ID) != 0)
+    {
+        warning(L"[ToolConfigurationCommand::init()] : Failed to register for CustomEvent.");
+        return false;
+    }
+
+    const ACE_WString usersPath = readPath(kUsersFileDefault, kUsersFileUri);
+    const ACE_WString workshopPath = readPath(kWorkshopFileDefault, kWorkshopFileUri);
+    m_fileSystemWatcher->addFile(toQString(usersPath));
+    m_fileSystemWatcher->addFile(toQString(workshopPath));
+
+    if (!m_messageBoxManager.acquire(ID(kMessageBoxManagerID)))
+    {
+        trace(L"[ToolConfigurationCommand::init()] Message Box Manager cannot be initialized.");
+        return false;
+    }
+    if (!m_bText.acquire(ID(kBTextID)))
+    {
+        trace(L"[ToolConfigurationCommand::init()] BText cannot be initialized.");
+        return false;
+    }
+    if (!m_procStartUpdateAgent.acquire(ID(kUpdateAgentID)))
+    {
+        trace(L"[ToolConfigurationCommand::init()] Cannot get proxy to ProcStartUpdateAgent.");
+        return false;
+    }
+
+    m_fileSystemWatcher->run(BOStream(true));
+    return true;
+}
+
+QObject* ToolConfigurationCommand::qObject()
+{
+    return this;
+}
+
+QString ToolConfigurationCommand::trUtf8(const char* sourceText, const char* comment)
+{
+    return staticMetaObject.tr(sourceText, comment);
+}
+
+void ToolConfigurationCommand::customEvent(QEvent*)
+{
+}
+
+ACE_WString ToolConfigurationCommand::readPath(const wchar_t* defaultPath, const wchar_t* uri)
+{
+    ACE_WString path(defaultPath);
+    if (m_dataManager.isAvailable())
+        m_dataManager->getString(ID(uri), path);
+    return path;
+}
+
+void ToolConfigurationCommand::handleEvent(const CustomEvent& event)
+{
+    trace(L"[ToolConfigurationCommand::handleEvent(CustomEvent)]: Method started.");
+    if (event.get_type() != kFileChangedEvent)
+        return;
+
+    ACE_WString changedPath;
+    changedPath = event.get_data();
+
+    const ACE_WString usersPath = readPath(kUsersFileDefault, kUsersFileUri);
+    const ACE_WString workshopPath = readPath(kWorkshopFileDefault, kWorkshopFileUri);
+    ACE_WString updatePath = readPath(kUpdateFileDefault, kUpdateFileUri);
+    if (updatePath.is_empty())
+        updatePath = kUpdateFileDefault;
+
+    if (changedPath == workshopPath)
+    {
+        createDMData(false);
+    }
+    else if (changedPath == usersPath)
+    {
+        createDMData(false);
+        refreshUsersListData();
+    }
+    else if (changedPath == updatePath)
+    {
+        createDMData(false);
+    }
+}
+
+void ToolConfigurationCommand::refreshUsersListData()
+{
+    // USERS LIST: the users command republishes the user set from the users file here:
+    //   UsersCommand usersCommand(QString("WC_USERSCOMMAND"));
+    //   usersCommand.createDMUsersData();
+    // It arrives with the users dialog; until then the users list is not republished.
+}
+
+void ToolConfigurationCommand::createDMData(bool reset)
+{
+    trace(L"[ToolConfigurationCommand::createDMData] : Method started");
+
+    delete m_pWorkshopInfoUpdater;
+    m_pWorkshopInfoUpdater = nullptr;
+    m_pWorkshopInfoUpdater = new WorkshopInfoUpdater(readPath(kWorkshopFileDefault, kWorkshopFileUri));
+    // A missing workshop file leaves the store loaded and empty (its first save creates the
+    // file); only a file that cannot be read stops the publication.
+    if (!m_pWorkshopInfoUpdater->load() && !m_pWorkshopInfoUpdater->isLoaded())
+        return;
+
+    delete m_pUsersUpdater;
+    m_pUsersUpdater = nullptr;
+    m_pUsersUpdater = new UsersUpdater(readPath(kUsersFileDefault, kUsersFileUri));
+    if (!m_pUsersUpdater->load())
+        return;
+
+    {
+        ACE_Guard<ACE_Thread_Mutex> guard(m_storesMutex);
+        delete m_pUpdateUpdater;
+        m_pUpdateUpdater = nullptr;
+
+        const ID activeUri = controlUri(ACE_WString(kActivePreparateur));
+        ACE_WString activePath;
+        if (m_dataManager.isAvailable())
+            m_dataManager->getString(activeUri, activePath);
+        if (activePath.is_empty() || reset)
+        {
+            // A reset goes back to the configured file even when the URI is absent.
+            activePath.clear();
+            if (m_dataManager.isAvailable())
+                m_dataManager->getString(ID(kUpdateFileUri), activePath);
+            if (activePath.is_empty())
+                activePath = kUpdateFileDefault;
+            if (m_dataManager.isAvailable())
+                m_dataManager->createData(activeUri, BString(activePath));
+        }
+
+        m_pUpdateUpdater = new UpdateUpdater(activePath);
+        if (!m_pUpdateUpdater->load())
+            return;
+    }
+
+    createDataForControl(L"ProjectNumberEdit");
+    createDataForControl(L"CompanyNameEdit");
+    createDataForControl(L"NameEdit");
+    createDataForControl(L"StreetEdit");
+    createDataForTwoEditControl(L"TownPostCodeEdit");
+    createStaticConfigData(ACE_WString(L"data:/Configuration/DoC/SoftInformation/InstallCountry"), L"Country");
+    createDataForControl(L"PhoneNumberEdit");
+    createDataForControl(L"FaxNumberEdit");
+    createDataForCombo(L"BrandCombo");
+    createStaticConfigData(ACE_WString(L"data:/Configuration/DoC/SoftInformation/InstallLanguage"), L"Language");
+    createStaticConfigData(ACE_WString(L"data:/Configuration/DoC/SoftInformation/Version"), ACE_WString(L"data:/Configuration/DoC/SoftInformation/VersionFormation"), ACE_WString(L" "), L"SerialNo");
+    createDataForCheckBox(L"ASRMChk", reset);
+    createMarvaneNetData();
+    createDataForUUControl(L"App2AppPort");
+    createDataForUUControl(L"App2AppIP");
+    createDataForUUControl(L"App2AppDealerID");
+    ACE_WString app2AppIP;
+    m_app2AppValues.getString(L"App2AppIP", app2AppIP);
+    m_app2AppIP = app2AppIP;
+    createDataForConfigCheckBox(L"CheckInternet");
+    createDataForControl(L"DistributionFolderPath");
+    createDataForStringControl(L"TaskTimeEdit");
+    createDataForUpdateRadioButtons();
+}
+
+void ToolConfigurationCommand::createDataForControl(const ACE_WString& name)
+{
+    trace(L"[ToolConfigurationCommand::createDataForControl] : Method started");
+    if (!m_dataManager.isAvailable() || m_pWorkshopInfoUpdater == nullptr || m_pUpdateUpdater == nullptr)
+        return;
+
+    ACE_WString text;
+    if (name == L"ProjectNumberEdit")
+        text = m_pWorkshopInfoUpdater->getBusinessNumber();
+    else if (name == L"CompanyNameEdit")
+        text = m_pWorkshopInfoUpdater->getCorporateName();
+    else if (name == L"NameEdit")
+        text = m_pWorkshopInfoUpdater->getName();
+    else if (name == L"StreetEdit")
+        text = m_pWorkshopInfoUpdater->getRoad();
+    else if (name == L"PhoneNumberEdit")
+        text = m_pWorkshopInfoUpdater->getTelephone();
+    else if (name == L"FaxNumberEdit")
+        text = m_pWorkshopInfoUpdater->getFax();
+    else if (name == L"DistributionFolderPath")
+        text = m_pUpdateUpdater->getDistributionFolderPath();
+
+    m_dataManager->createData(controlUri(name), makeEditRecord(kStateEditable, text));
+}
+
+void ToolConfigurationCommand::createDataForUUControl(const ACE_WString& name)
+{
+    ACE_Guard<ACE_Thread_Mutex> guard(m_storesMutex);
+    trace(L"[ToolConfigurationCommand::createDataForUUControl] : Method started");
+    if (!m_dataManager.isAvailable() || m_pUsersUpdater == nullptr)
+        return;
+
+    ACE_WString text;
+    bool known = true;
+    if (name == L"App2AppPort")
+        text = m_pUsersUpdater->getApp2AppPort();
+    else if (name == L"App2AppIP")
+        text = m_pUsersUpdater->getApp2AppIP();
+    else if (name == L"App2AppDealerID")
+        text = m_pUsersUpdater->getApp2AppDealerID();
+    else
+        known = false;
+    if (known)
+        m_app2AppValues.setString(name, text);
+
+    m_dataManager->createData(controlUri(name), makeEditRecord(kStateEditable, text));
+}
+
+void ToolConfigurationCommand::createDataForTwoEditControl(const ACE_WString& name)
+{
+    trace(L"[ToolConfigurationCommand::createDataForTwoEditControl] : Method started");
+    if (!m_dataManager.isAvailable() || m_pWorkshopInfoUpdater == nullptr)
+        return;
+    const ACE_WString postalCode = m_pWorkshopInfoUpdater->getPostalCode();
+    const ACE_WString town = m_pWorkshopInfoUpdater->getTown();
+    m_dataManager->createData(controlUri(name), makeTwoEditRecord(postalCode, town));
+}
+
+void ToolConfigurationCommand::createDataForStringControl(const ACE_WString& name)
+{
+    trace(L"[ToolConfigurationCommand::createDataForStrinControl] : Method started");
+    if (!m_dataManager.isAvailable() || m_pUpdateUpdater == nullptr)
+        return;
+    ACE_WString text;
+    if (name == L"TaskTimeEdit")
+        text = m_pUpdateUpdater->getTaskTime();
+    m_dataManager->createData(controlUri(name), BString(text));
+}
+
+void ToolConfigurationCommand::createDataForCheckBox(const ACE_WString& name, bool reset)
+{
+    trace(L"[ToolConfigurationCommand::createDataForCheckBox] : Method started");
+    if (!m_dataManager.isAvailable())
+        return;
+    const ID uri = controlUri(name);
+    bool published = false;
+    if (m_dataManager->getBool(uri, published) == 0 && !reset)
+        m_bRecordingMode = published;
+    m_dataManager->createData(uri, BBool(m_bRecordingMode));
+}
+
+void ToolConfigurationCommand::createDataForConfigCheckBox(const ACE_WString& name)
+{
+    trace(L"[ToolConfigurationCommand::createDataForConfigCheckBox] : Method started");
+    if (!m_dataManager.isAvailable())
+        return;
+    bool checked = false;
+    if (m_pUpdateUpdater != nullptr && name == L"CheckInternet")
+        checked = m_pUpdateUpdater->getCheckInternet();
+    m_dataManager->createData(controlUri(name), BBool(checked));
+}
+
+void ToolConfigurationCommand::updateDataForControl(const ACE_WString& name, const ACE_WString& text)
+{
+    trace(L"[ToolConfigurationCommand::updateDataForControl] : Method started");
+    if (!m_dataManager.isAvailable())
+        return;
+    m_dataManager->setData(controlUri(name), makeEditRecord(kStateEditable, text));
+}
+
+void ToolConfigurationCommand::updateDataForControl(const ACE_WString& name, const ACE_WString& text, bool fixed)
+{
+    trace(L"[ToolConfigurationCommand::updateDataForControl] : Method started");
+    if (!m_dataManager.isAvailable())
+        return;
+    m_dataManager->setData(controlUri(name), makeEditRecord(fixed ? kStateFixed : kStateEditable, text));
+}
+
+void ToolConfigurationCommand::updateDataForTwoEditControl(const ACE_WString& name, const ACE_WString& edit1Text,
+                                                           const ACE_WString& edit2Text)
+{
+    trace(L"[ToolConfigurationCommand::updateDataForTwoEditControl] : Method started");
+    if (!m_dataManager.isAvailable())
+        return;
+    m_dataManager->setData(controlUri(name), makeTwoEditRecord(edit1Text, edit2Text));
+}
+
+void ToolConfigurationCommand::updateDataForStringControl(const ACE_WString& name, const ACE_WString& text)
+{
+    trace(L"[ToolConfigurationCommand::updateDataForStringControl] : Method started");
+    if (!m_dataManager.isAvailable())
+        return;
+    m_dataManager->setData(controlUri(name), BString(text));
+}
+
+// ---------------------------------------------------------------------------------------------
+// Static configuration data and brand list
+
+ACE_WString ToolConfigurationCommand::readConfigString(const ACE_WString& uri)
+{
+    ACE_WString text;
+    if (m_dataManager.isAvailable())
+        m_dataManager->getString(ID(uri), text);
+
+    const ACE_WString::size_type hash = text.find(L'#');
+    if (hash == ACE_WString::npos)
+        return text;
+    const ACE_WString textId = text.substring(hash + 1);
+    const ACE_WString defaultText = text.substring(0, hash);
+
+    SmartProxy<PBText> bText;
+    if (bText.acquire(ID(kBTextID)))
+        text = bText->getText(textId, defaultText);
+    return text;
+}
+
+void ToolConfigurationCommand::publishDisplayOnly(const ACE_WString& name, const ACE_WString& text)
+{
+    if (!m_dataManager.isAvailable())
+        return;
+    m_dataManager->createData(controlUri(name), makeEditRecord(kStateDisplayOnly, text));
+}
+
+void ToolConfigurationCommand::createStaticConfigData(const ACE_WString& uri, ACE_WString name)
+{
+    publishDisplayOnly(name, readConfigString(uri));
+}
+
+void ToolConfigurationCommand::createStaticConfigData(const ACE_WString& uri1, const ACE_WString& uri2,
+                                                      const ACE_WString& separator, ACE_WString name)
+{
+    ACE_WString text = readConfigString(uri1);
+    text += separator;
+    text += readConfigString(uri2);
+    publishDisplayOnly(name, text);
+}
+
+void ToolConfigurationCommand::createStaticFileData(const ACE_WString& section, const ACE_WString& key,
+                                                    const ACE_WString& name)
+{
+    ACE_WString iniPath;
+    if (m_dataManager.isAvailable())
+        m_dataManager->getString(ID(kIniFileUri), iniPath);
+
+    ACE_WString value;
+    {
+        CIniFile iniFile;
+        if (iniFile.openIniFile(CIniFile::eREAD, iniPath) == 0)
+            iniFile.readAttribute(section, key, value);
+    }
+    publishDisplayOnly(name, value);
+}
+
+void ToolConfigurationCommand::createMarvaneNetData()
+{
+    createStaticFileData(L"TEST", L"Flag_HF", L"HFconnection");
+    createStaticFileData(L"TEST", L"NetWork", L"IPaddress");
+    createStaticFileData(L"REPROGRAMMATION", L"Nom_Browser1", L"Navigator1");
+    createStaticFileData(L"REPROGRAMMATION", L"Nom_Browser2", L"Navigator2");
+    createStaticConfigData(ACE_WString(L"data:/Configuration/MenuBar/ToolConfigData/DiagnosticURL"), L"DiagURL");
+    createStaticConfigData(ACE_WString(L"data:/Configuration/MenuBar/ToolConfigData/TargetURL"), L"TargetURL");
+    createStaticConfigData(ACE_WString(L"data:/Configuration/MenuBar/ToolConfigData/OrbisURL"), L"OrbisURL");
+    createStaticConfigData(ACE_WString(L"data:/Configuration/DoC/FicheDiagnostic/FicheDiagServer"), L"FaultServer");
+    createStaticConfigData(ACE_WString(L"data:/Configuration/DoC/FicheDiagnostic/SMTPServer"), L"SMTPServer");
+}
+
+void ToolConfigurationCommand::createDataForCombo(const ACE_WString& name)
+{
+    trace(L"[ToolConfigurationCommand::createDataForCombo] : Method started");
+    if (!m_dataManager.isAvailable() || m_pWorkshopInfoUpdater == nullptr)
+        return;
+
+    BSet brands(10);
+    m_dataManager->getData(ID(kBrandsUri), brands);
+
+    SmartProxy<PBText> bText;
+    if (!bText.acquire(ID(kBTextID)))
+        return;
+
+    const StringSet keys = brands.getAllKeys();
+    std::vector<std::wstring> paddedKeys;
+    for (int i = 0; i < keys.length(); ++i)
+    {
+        ACE_WString key;
+        keys.getAt(i, key);
+        const ACE_WString padded = padBrandKey(key);
+        paddedKeys.emplace_back(padded.c_str(), padded.length());
+    }
+    std::sort(paddedKeys.begin(), paddedKeys.end());
+
+    BSet items(10);
+    ACE_WString firstLabel;
+    for (size_t i = 0; i < paddedKeys.size(); ++i)
+    {
+        const ACE_WString paddedKey(paddedKeys[i].c_str(), paddedKeys[i].size());
+        const int number = ACE_OS::atoi(paddedKey.c_str());
+        ACE_WString defaultLabel;
+        brands.getString(paddedKey, defaultLabel);
+        const ACE_WString label = bText->getText(number, defaultLabel);
+        items.set(paddedKey, BString(label));
+        if (i == 0)
+            firstLabel = label;
+    }
+
+    BSet record(10);
+    record.set(L"state", BInt(kStateEditable));
+    record.set(L"value", items);
+
+    ACE_WString selected = m_pWorkshopInfoUpdater->getDefaultBrand();
+    if (selected.is_empty() && !paddedKeys.empty())
+        selected = firstLabel;
+    record.set(L"selected", BString(selected));
+    m_pWorkshopInfoUpdater->setDefaultBrand(selected);
+    m_dataManager->createData(controlUri(name), record);
+}
+
+void ToolConfigurationCommand::createDataForUpdateRadioButtons()
+{
+    trace(L"[ToolConfigurationCommand::createDataForUpdateRadioButtons] : Method started");
+    // The radio buttons and the mode's distribution folder come with the update-mode work.
+}
+
+// ---------------------------------------------------------------------------------------------
+// Workshop and App2App field slots
+
+void ToolConfigurationCommand::onProjectNumberChanged(QString qstrValue)
+{
+    trace(L"[ToolConfigurationCommand::onProjectNumberChanged] : Method started");
+    if (m_pWorkshopInfoUpdater == nullptr || !m_dataManager.isAvailable())
+        return;
+    const ACE_WString text = toWide(qstrValue);
+    updateDataForControl(L"ProjectNumberEdit", text);
+    m_pWorkshopInfoUpdater->setBusinessNumber(text);
+}
+
+void ToolConfigurationCommand::onCompanyNameChanged(QString qstrValue)
+{
+    trace(L"[ToolConfigurationCommand::onCompanyNameChanged] : Method started");
+    if (m_pWorkshopInfoUpdater == nullptr || !m_dataManager.isAvailable())
+        return;
+    const ACE_WString text = toWide(qstrValue);
+    updateDataForControl(L"CompanyNameEdit", text);
+    m_pWorkshopInfoUpdater->setCorporateName(text);
+}
+
+void ToolConfigurationCommand::onNameChanged(QString qstrValue)
+{
+    trace(L"[ToolConfigurationCommand::onNameChanged] : Method started");
+    if (m_pWorkshopInfoUpdater == nullptr || !m_dataManager.isAvailable())
+        return;
+    const ACE_WString text = toWide(qstrValue);
+    updateDataForControl(L"NameEdit", text);
+    m_pWorkshopInfoUpdater->setName(text);
+}
+
+void ToolConfigurationCommand::onStreetChanged(QString qstrValue)
+{
+    trace(L"[ToolConfigurationCommand::onStreetChanged] : Method started");
+    if (m_pWorkshopInfoUpdater == nullptr || !m_dataManager.isAvailable())
+        return;
+    const ACE_WString text = toWide(qstrValue);
+    updateDataForControl(L"StreetEdit", text);
+    m_pWorkshopInfoUpdater->setRoad(text);
+}
+
+void ToolConfigurationCommand::onTownOrPostCodeChanged(QString qstrPostcode, QString qstrTown)
+{
+    trace(L"[ToolConfigurationCommand::onTownOrPostCodeChanged] : Method started");
+    if (m_pWorkshopInfoUpdater == nullptr || !m_dataManager.isAvailable())
+        return;
+    const ACE_WString postalCode = toWide(qstrPostcode);
+    const ACE_WString town = toWide(qstrTown);
+    updateDataForTwoEditControl(L"TownPostCodeEdit", postalCode, town);
+    m_pWorkshopInfoUpdater->setTown(town);
+    m_pWorkshopInfoUpdater->setPostalCode(postalCode);
+}
+
+void ToolConfigurationCommand::onPhoneNumberChanged(QString qstrValue)
+{
+    trace(L"[ToolConfigurationCommand::onPhoneNumberChanged] : Method started");
+    if (m_pWorkshopInfoUpdater == nullptr || !m_dataManager.isAvailable())
+        return;
+    const ACE_WString text = toWide(qstrValue);
+    updateDataForControl(L"PhoneNumberEdit", text);
+    m_pWorkshopInfoUpdater->setTelephone(text);
+}
+
+void ToolConfigurationCommand::onFaxNumberChanged(QString qstrValue)
+{
+    trace(L"[ToolConfigurationCommand::onFaxNumberChanged] : Method started");
+    if (m_pWorkshopInfoUpdater == nullptr || !m_dataManager.isAvailable())
+        return;
+    const ACE_WString text = toWide(qstrValue);
+    updateDataForControl(L"FaxNumberEdit", text);
+    m_pWorkshopInfoUpdater->setFax(text);
+}
+
+void ToolConfigurationCommand::onManufacturerChanged(QString qstrValue)
+{
+    trace(L"[ToolConfigurationCommand::onManufacturerChanged] : Method started");
+    if (m_pWorkshopInfoUpdater == nullptr || !m_dataManager.isAvailable())
+        return;
+    m_pWorkshopInfoUpdater->setDefaultBrand(toWide(qstrValue));
+}
+
+void ToolConfigurationCommand::onPortChanged(QString qstrValue)
+{
+    trace(L"[ToolConfigurationCommand::onPortChanged] : Method started");
+    if (!m_dataManager.isAvailable())
+        return;
+    const ACE_WString text = toWide(qstrValue);
+    updateDataForControl(L"App2AppPort", text);
+    m_app2AppValues.setString(L"App2AppPort", text);
+}
+
+void ToolConfigurationCommand::onIPAddressChanged(QString qstrValue)
+{
+    trace(L"[ToolConfigurationCommand::onIPAddressChanged] : Method started");
+    if (!m_dataManager.isAvailable())
+        return;
+    const ACE_WString text = toWide(qstrValue);
+    updateDataForControl(L"App2AppIP", text);
+    m_app2AppValues.setString(L"App2AppIP", text);
+}
+
+void ToolConfigurationCommand::onDealerIDChanged(QString qstrValue)
+{
+    trace(L"[ToolConfigurationCommand::onDealerIDChanged] : Method started");
+    if (!m_dataManager.isAvailable())
+        return;
+    const ACE_WString text = toWide(qstrValue);
+    updateDataForControl(L"App2AppDealerID", text);
+    m_app2AppValues.setString(L"App2AppDealerID", text);
+}
+
+void ToolConfigurationCommand::onButtonSaveLogsClicked()
+{
+    CLogsZipperGui::zipLogsWithGui();
+}
+
+// ---------------------------------------------------------------------------------------------
+// Update-mode, scheduling, OK and Cancel slots: their behaviour comes with the update-mode and
+// commit work; until then each only writes its entry line.
+
+void ToolConfigurationCommand::onRecordingModeChecked(bool)
+{
+    trace(L"[ToolConfigurationCommand::onRecordingModeChecked] : Method started");
+}
+
+void ToolConfigurationCommand::onOKButtonClicked()
+{
+    trace(L"[ToolConfigurationCommand::onOKButtonClicked] : Method started");
+}
+
+void ToolConfigurationCommand::onCancelButtonClicked()
+{
+}
+
+void ToolConfigurationCommand::onFolderBrowserButtonClicked()
+{
+    trace(L"[ToolConfigurationCommand::onFolderBrowserButtonClicked] : Method started");
+}
+
+void ToolConfigurationCommand::onCheckInternetChecked(bool)
+{
+    trace(L"[ToolConfigurationCommand::onCheckInternetChecked] : Method started");
+}
+
+void ToolConfigurationCommand::onLocalRadioButtonClicked()
+{
+    trace(L"[ToolConfigurationCommand::onLocalRadioButtonClicked] : Method started");
+}
+
+void ToolConfigurationCommand::onA2ARadioButtonClicked()
+{
+    trace(L"[ToolConfigurationCommand::onA2ARadioButtonClicked] : Method started");
+}
+
+void ToolConfigurationCommand::onOtherRadioButtonClicked()
+{
+    trace(L"[ToolConfigurationCommand::onOtherRadioButtonClicked] : Method started");
+}
+
+void ToolConfigurationCommand::onDistributionFolderPathChanged(QString)
+{
+    trace(L"[ToolConfigurationCommand::onDistributionFolderPathChanged] : Method started");
+}
+
+void ToolConfigurationCommand::onTaskTimeEditChanged(const QTime&)
+{
+    trace(L"[ToolConfigurationCommand::onTaskTimeEditChanged] : Method started");
+}
+
+void ToolConfigurationCommand::onConfigurationTestButtonClicked()
+{
+    trace(L"[ToolConfigurationCommand::onConfigurationTestButtonClicked] : Method started");
+}
