@@ -1,0 +1,25 @@
+#pragma once
+
+#include "Win32Types.h"
+
+#include <string>
+
+// Where the task scheduler keeps its tasks, and the state of its service. Shared by every
+// thread of the process.
+class TESSEL_EXPORT TaskSchedulerSettings
+{
+public:
+    // The folder holding one file per task (UTF-8 path). An empty path goes back to the
+    // per-user default: $XDG_DATA_HOME/ProcToolConfiguration/Tasks, or
+    // ~/.local/share/ProcToolConfiguration/Tasks.
+    static void setTasksFolder(const std::string& path);
+    static std::string tasksFolder();
+
+    // The state the "Schedule" service reports. 0 (the default) lets the service run whenever
+    // the tasks folder can be used; any SERVICE_* state fixes it (tests mark it stopped).
+    static void setServiceState(DWORD state);
+    // The state in effect now: SERVICE_RUNNING or SERVICE_STOPPED when automatic.
+    static DWORD serviceState();
+    // True when the tasks folder exists or can be made, and can be written.
+    static bool tasksFolderUsable();
+};
