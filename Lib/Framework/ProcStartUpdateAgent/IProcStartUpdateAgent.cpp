@@ -1,0 +1,3 @@
+#include "IProcStartUpdateAgent.h"
+
+IProcStartUpdateAgent::~IProcStartUpdateAgent() = default;
