@@ -29,6 +29,11 @@ struct SplitCase
     const wchar_t* ext;
 };
 
+void PrintTo(const SplitCase& c, std::ostream* os)
+{
+    *os << '"' << WideString::toUtf8(c.path) << '"';
+}
+
 class SplitPathTest : public ::testing::TestWithParam<SplitCase>
 {
 };
@@ -108,6 +113,11 @@ struct MakeCase
     const wchar_t* ext;
     const wchar_t* expected;
 };
+
+void PrintTo(const MakeCase& c, std::ostream* os)
+{
+    *os << '"' << WideString::toUtf8(c.expected) << '"';
+}
 
 class MakePathTest : public ::testing::TestWithParam<MakeCase>
 {
@@ -213,6 +223,11 @@ struct FullPathCase
     const char* expectedBelowCurrent; // null: the expected text is absolute
     const char* expectedAbsolute;
 };
+
+void PrintTo(const FullPathCase& c, std::ostream* os)
+{
+    *os << '"' << (c.relative != nullptr ? WideString::toUtf8(c.relative) : std::string("(null)")) << '"';
+}
 
 class FullPathTest : public ::testing::TestWithParam<FullPathCase>
 {

@@ -20,6 +20,11 @@ struct ParentCase
     const wchar_t* parent;
 };
 
+void PrintTo(const ParentCase& c, std::ostream* os)
+{
+    *os << '"' << u(ACE_WString(c.path)) << '"';
+}
+
 class ParentFolderName : public ::testing::TestWithParam<ParentCase>
 {
 };

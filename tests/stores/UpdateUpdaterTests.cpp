@@ -141,6 +141,11 @@ struct DefaultCase
     const char* expected;
 };
 
+void PrintTo(const DefaultCase& c, std::ostream* os)
+{
+    *os << c.key << "=" << (c.fileValue != nullptr ? "\"" + std::string(c.fileValue) + "\"" : "(missing)");
+}
+
 class UpdateUpdaterDefaults : public UpdateUpdaterTest, public ::testing::WithParamInterface<DefaultCase>
 {
 };

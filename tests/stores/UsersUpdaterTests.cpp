@@ -194,6 +194,11 @@ struct ActivationCase
     bool expected;
 };
 
+void PrintTo(const ActivationCase& c, std::ostream* os)
+{
+    *os << (c.stored != nullptr ? "\"" + std::string(c.stored) + "\"" : "(missing)");
+}
+
 class UsersUpdaterActivation : public UsersUpdaterTest, public ::testing::WithParamInterface<ActivationCase>
 {
 };

@@ -176,6 +176,11 @@ struct FieldCase
     std::function<bool(WorkshopInfoUpdater&, const ACE_WString&)> set;
 };
 
+void PrintTo(const FieldCase& c, std::ostream* os)
+{
+    *os << c.key;
+}
+
 class WorkshopInfoUpdaterFields : public WorkshopInfoUpdaterTest, public ::testing::WithParamInterface<FieldCase>
 {
 };
@@ -332,6 +337,11 @@ struct SetBrandCase
     const char* stored;
 };
 
+void PrintTo(const SetBrandCase& c, std::ostream* os)
+{
+    *os << '"' << c.shown << '"';
+}
+
 class WorkshopSetBrand : public WorkshopBrandTest, public ::testing::WithParamInterface<SetBrandCase>
 {
 };
@@ -359,6 +369,11 @@ struct GetBrandCase
     const char* stored;
     const char* shown;
 };
+
+void PrintTo(const GetBrandCase& c, std::ostream* os)
+{
+    *os << '"' << c.stored << '"';
+}
 
 class WorkshopGetBrand : public WorkshopBrandTest, public ::testing::WithParamInterface<GetBrandCase>
 {
