@@ -5,6 +5,7 @@
 #include "LogCapture.h"
 #include "PToolConfigControllersFactory.h"
 #include "SmartProxy.h"
+#include "UsersCommand.h"
 #include "WidgetCommandBase.h"
 
 #include <gtest/gtest.h>
@@ -73,6 +74,17 @@ TEST(FactoryTest, UnknownAndWrongCaseNamesGiveNoController)
         std::unique_ptr<WidgetCommandBase> controller(factory.getControllerByName(ACE_WString(name)));
         EXPECT_EQ(controller, nullptr);
     }
+}
+
+TEST(FactoryTest, UsersCommandNameGivesANewControllerOnEveryCall)
+{
+    CToolConfigControllersFactory factory{ID(kFactoryID)};
+    std::unique_ptr<WidgetCommandBase> first(factory.getControllerByName(ACE_WString(L"WC_USERSCOMMAND")));
+    std::unique_ptr<WidgetCommandBase> second(factory.getControllerByName(ACE_WString(L"WC_USERSCOMMAND")));
+    ASSERT_NE(dynamic_cast<UsersCommand*>(first.get()), nullptr);
+    ASSERT_NE(dynamic_cast<UsersCommand*>(second.get()), nullptr);
+    EXPECT_NE(first.get(), second.get());
+    EXPECT_EQ(first->getCommandID(), QString("WC_USERSCOMMAND"));
 }
 
 TEST(FactoryTest, LifecycleWritesItsTraceLines)

@@ -1,6 +1,7 @@
 #include "CToolConfigControllersFactory.h"
 
 #include "TesselLog_Static.h"
+#include "UsersCommand.h"
 #include "WidgetCommandBase.h"
 
 namespace
@@ -32,7 +33,8 @@ WidgetCommandBase* CToolConfigControllersFactory::getControllerByName(const ACE_
 {
     TesselLog_Static::logTrace_static(kComponent, kFile, kClass,
                                       L"[CToolConfigControllersFactory::getControllerByName()] method started");
-    (void)name;
+    if (name == L"WC_USERSCOMMAND")
+        return new UsersCommand(QString("WC_USERSCOMMAND"));
     return nullptr;
 }
 
