@@ -5,6 +5,9 @@
 
 #include <atomic>
 #include <cerrno>
+#include <chrono>
+#include <filesystem>
+#include <thread>
 
 using namespace OnlineUpdateTest;
 using namespace OnlineUpdateCommand_NS;
@@ -16,6 +19,21 @@ const int kWarning = TesselLog_Static::eWARNING;
 const int kInformation = TesselLog_Static::eINFORMATION;
 
 std::atomic<bool> g_failThreadStart{false};
+
+// True when a thread of this process carries `name`.
+bool threadNamed(const std::string& name)
+{
+    std::error_code ignored;
+    for (const auto& task : std::filesystem::directory_iterator("/proc/self/task", ignored))
+    {
+        std::string comm = TempDir::read((task.path() / "comm").string());
+        if (!comm.empty() && comm.back() == '\n')
+            comm.pop_back();
+        if (comm == name)
+            return true;
+    }
+    return false;
+}
 
 std::string agentLine(const char* name)
 {
@@ -330,4 +348,24 @@ TEST_F(ConfigurationTest, GuiProcessesEventsWhileWaiting)
     ASSERT_EQ(1u, m_watcher.results.size());
     EXPECT_EQ(m_watcher.results[0].preparerText.toStdString(), preparerText(0));
     EXPECT_TRUE(m_log.contains(agentLine("eOK"), kInformation));
+}
+
+TEST_F(ConfigurationTest, WorkerThreadIsNamed)
+{
+    useGatedAgent(0);
+    OnLineUpdateCommand command("WC_ONLINEUPDATECOMMAND");
+    bool named = false;
+    m_watcher.onWaitShown = [this, &named](Dialog_ConfigurationTestBase&) {
+        // The worker names itself first and then waits for the gated agent.
+        for (int attempt = 0; attempt < 10000 && !named; ++attempt)
+        {
+            named = threadNamed("OnLineUpdateCom");
+            if (!named)
+                std::this_thread::sleep_for(std::chrono::milliseconds(1));
+        }
+        openGate();
+    };
+    EXPECT_TRUE(command.init());
+    EXPECT_TRUE(named);
+    EXPECT_EQ(1u, m_watcher.results.size());
 }
