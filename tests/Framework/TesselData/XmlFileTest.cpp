@@ -246,7 +246,7 @@ TEST(XmlFile, WriteFailureMidwayKeepsTheOldFile)
     const std::string before = TempDir::read(path);
 
     BSet big;
-    big.setString(L"value", ACE_WString(std::wstring(20000, L'x').c_str()));
+    big.setString(L"value", WideString::fromStd(std::wstring(20000, L'x')));
     const pid_t child = fork();
     ASSERT_NE(child, -1);
     if (child == 0)
