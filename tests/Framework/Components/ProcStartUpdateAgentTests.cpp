@@ -11,8 +11,11 @@
 
 #include <sys/stat.h>
 
+#include <chrono>
+#include <filesystem>
 #include <future>
 #include <string>
+#include <thread>
 
 namespace
 {
@@ -126,25 +129,36 @@ TEST_F(UpdateAgentTest, TestAnswerReplacesTheAgentUntilCleared)
 
 TEST_F(UpdateAgentTest, CallOnAWorkerOutlivesTheComponent)
 {
-    m_agent->setTestAnswer(IProcStartUpdateAgent::eNOK_PATH_NOT_CONFIGURED, 300);
-    std::promise<void> started;
-    auto answer = std::async(std::launch::async, [&]() {
+    // The agent tells when it runs, so the component is destroyed while the call is under way.
+    const std::string started = m_dir.file("started");
+    const std::string release = m_dir.file("release");
+    configureAgent(writeAgent("touch '" + started + "'; while [ ! -e '" + release + "' ]; do sleep 0.01; done; exit 5"));
+    auto answer = std::async(std::launch::async, []() {
         SmartProxy<PProcStartUpdateAgent> workerProxy;
         if (!workerProxy.acquire(ID(CProcStartUpdateAgent::componentID)))
-        {
-            started.set_value();
             return static_cast<int>(IProcStartUpdateAgent::eNOK_NO_AGENT);
-        }
-        started.set_value();
         return static_cast<int>(workerProxy->checkConfigurationPreparer());
     });
-    started.get_future().wait();
-    // The component goes away while the worker's call is under way.
+    while (!std::filesystem::exists(started))
+        std::this_thread::sleep_for(std::chrono::milliseconds(5));
     ASSERT_EQ(destroyComponent(ID(CProcStartUpdateAgent::componentID)), 0);
     m_agent = nullptr;
+    TempDir::write(release, "");
     EXPECT_EQ(answer.get(), IProcStartUpdateAgent::eNOK_PATH_NOT_CONFIGURED);
     EXPECT_EQ(m_proxy->checkConfigurationPreparer(), IProcStartUpdateAgent::eNOK_NO_AGENT);
     EXPECT_FALSE(m_proxy->isOnlineUpdateEnabled());
+}
+
+TEST_F(UpdateAgentTest, TestAnswerComesAfterItsDelayOnAWorker)
+{
+    m_agent->setTestAnswer(IProcStartUpdateAgent::eNOK_SERVER_NOT_FOUND, 50);
+    auto answer = std::async(std::launch::async, []() {
+        SmartProxy<PProcStartUpdateAgent> workerProxy;
+        if (!workerProxy.acquire(ID(CProcStartUpdateAgent::componentID)))
+            return static_cast<int>(IProcStartUpdateAgent::eNOK_NO_AGENT);
+        return static_cast<int>(workerProxy->checkConfigurationPreparer());
+    });
+    EXPECT_EQ(answer.get(), IProcStartUpdateAgent::eNOK_SERVER_NOT_FOUND);
 }
 
 TEST_F(UpdateAgentTest, OnlineUpdateSwitchComesFromTheDataManager)
