@@ -387,6 +387,11 @@ struct ConfigTextCase
     const char* expected;
 };
 
+void PrintTo(const ConfigTextCase& c, std::ostream* os)
+{
+    *os << c.label;
+}
+
 class StaticConfigTest : public ToolConfigurationTest, public ::testing::WithParamInterface<ConfigTextCase>
 {
 };
@@ -498,6 +503,11 @@ struct BrokenFileCase
     bool usersBuilt;
     bool updateBuilt;
 };
+
+void PrintTo(const BrokenFileCase& c, std::ostream* os)
+{
+    *os << c.label;
+}
 
 class BrokenFileTest : public ToolConfigurationTest, public ::testing::WithParamInterface<BrokenFileCase>
 {
@@ -715,6 +725,11 @@ struct InitCase
     bool updateAgent;
 };
 
+void PrintTo(const InitCase& c, std::ostream* os)
+{
+    *os << c.label;
+}
+
 // Registration is refused by the events library when the handler is already there.
 class RefusedRegistrationCommand : public ToolConfigurationCommand
 {
@@ -799,6 +814,11 @@ struct EventCase
     bool rebuilt;
 };
 
+void PrintTo(const EventCase& c, std::ostream* os)
+{
+    *os << c.label;
+}
+
 class FileEventTest : public ToolConfigurationTest, public ::testing::WithParamInterface<EventCase>
 {
 protected:
@@ -874,6 +894,11 @@ struct FieldSlotCase
     const char* control;
     std::function<ACE_WString(WorkshopInfoUpdater&)> stored;
 };
+
+void PrintTo(const FieldSlotCase& c, std::ostream* os)
+{
+    *os << c.slot;
+}
 
 class WorkshopSlotTest : public ToolConfigurationTest, public ::testing::WithParamInterface<FieldSlotCase>
 {
