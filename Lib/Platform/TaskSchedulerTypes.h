@@ -4,7 +4,8 @@
 
 #include "Win32Com.h"
 
-enum TASK_TRIGGER_TYPE
+// A fixed underlying type: a record from outside may hold any value here.
+enum TASK_TRIGGER_TYPE : int
 {
     TASK_TIME_TRIGGER_ONCE = 0,
     TASK_TIME_TRIGGER_DAILY = 1,
