@@ -5,7 +5,11 @@
 #include <QPointer>
 #include <QWidget>
 
+#include <memory>
+
 class IComponentManager;
+class QObject;
+class ToolConfigurationDialog;
 
 // The tool-configuration dialog's mediator
 // ("gui:GuiToolConfiguration?MedToolConfiguration#ToolConfiguaration.ui"): the host attaches the
@@ -30,7 +34,14 @@ public:
     // Calls of closeDialog so far.
     int closeCount() const;
 
+    // Builds the tool-configuration window over its controllers, keeps it (replacing any earlier
+    // one) and attaches it as the dialog; shown with show(). Null pointers leave the widgets
+    // without a controller.
+    ToolConfigurationDialog* createToolConfigurationDialog(QObject* toolConfiguration, QObject* users);
+    ToolConfigurationDialog* toolConfigurationDialog() const;
+
 private:
     QPointer<QWidget> m_dialog;
     int m_closeCount;
+    std::unique_ptr<ToolConfigurationDialog> m_toolConfigurationDialog;
 };

@@ -3,6 +3,7 @@
 #include "IComponentManager.h"
 #include "PMediator.h"
 #include "TesselLog_Static.h"
+#include "ToolConfigurationDialog.h"
 
 namespace
 {
@@ -53,4 +54,17 @@ int CMediator::closeDialog()
 int CMediator::closeCount() const
 {
     return m_closeCount;
+}
+
+ToolConfigurationDialog* CMediator::createToolConfigurationDialog(QObject* toolConfiguration, QObject* users)
+{
+    m_toolConfigurationDialog.reset();
+    m_toolConfigurationDialog = std::make_unique<ToolConfigurationDialog>(toolConfiguration, users);
+    setDialog(m_toolConfigurationDialog.get());
+    return m_toolConfigurationDialog.get();
+}
+
+ToolConfigurationDialog* CMediator::toolConfigurationDialog() const
+{
+    return m_toolConfigurationDialog.get();
 }

@@ -1,6 +1,7 @@
 #include "CToolConfigControllersFactory.h"
 
 #include "TesselLog_Static.h"
+#include "ToolConfigurationCommand.h"
 #include "UsersCommand.h"
 #include "WidgetCommandBase.h"
 
@@ -33,6 +34,8 @@ WidgetCommandBase* CToolConfigControllersFactory::getControllerByName(const ACE_
 {
     TesselLog_Static::logTrace_static(kComponent, kFile, kClass,
                                       L"[CToolConfigControllersFactory::getControllerByName()] method started");
+    if (name == L"WC_TOOLCONFIGURATION")
+        return new ToolConfigurationCommand(QString("WC_TOOLCONFIGURATION"));
     if (name == L"WC_USERSCOMMAND")
         return new UsersCommand(QString("WC_USERSCOMMAND"));
     return nullptr;
