@@ -116,13 +116,6 @@ int main(int argc, char** argv)
         }
         print(QStringLiteral("Screenshot: %1").arg(screenshot));
     }
-    if (!display || !press.isEmpty())
-    {
-        print(QStringLiteral("Working folder: %1").arg(host.workingFolder()));
-        for (const QString& line : dialog->summary())
-            print(QStringLiteral("  ") + line);
-    }
-
     if (!press.isEmpty())
     {
         const bool ok = press == QLatin1String("ok");
@@ -132,12 +125,17 @@ int main(int argc, char** argv)
             return 1;
         }
         QApplication::processEvents();
-        print(ok ? QStringLiteral("Pressed OK: the settings files are written.")
-                 : QStringLiteral("Pressed Cancel: the settings files are unchanged."));
+        print(QStringLiteral("Pressed %1; the window is %2.")
+                  .arg(ok ? QStringLiteral("OK") : QStringLiteral("Cancel"),
+                       dialog->isVisible() ? QStringLiteral("still open") : QStringLiteral("closed")));
+    }
+    if (!display || !press.isEmpty())
+    {
+        print(QStringLiteral("Working folder: %1").arg(host.workingFolder()));
+        for (const QString& line : dialog->summary())
+            print(QStringLiteral("  ") + line);
         return 0;
     }
-    if (!display)
-        return 0;
 
     QObject::connect(dialog, &QDialog::finished, &application, &QCoreApplication::quit);
     return application.exec();
