@@ -6,10 +6,14 @@
 #include "BString.h"
 #include "CIniFile.h"
 #include "CLogsZipperGui.h"
+#include "OnLineUpdateCommand.h"
 #include "StringSet.h"
 #include "StringUtilities.h"
 #include "TesselLog_Static.h"
 #include "UpdateUpdater.h"
+#include "UsersCommand.h"
+#include "OnLineUpdateCommand.h"
+#include "PMediator.h"
 #include "UsersUpdater.h"
 #include "WorkshopInfoUpdater.h"
 
@@ -17,8 +21,11 @@
 #include <ace/OS_NS_stdlib.h>
 
 #include <QEvent>
+#include <QFileDialog>
+#include <QStringList>
 
 #include <algorithm>
+#include <memory>
 #include <string>
 #include <vector>
 
@@ -35,6 +42,13 @@ const long kStateDisplayOnly = 19;
 
 const wchar_t* const kControlUriFormat = L"data:/Auto/SystemMenu/%s";
 const wchar_t* const kActivePreparateur = L"ActivePreparateur";
+const wchar_t* const kDistributionFolder = L"DistributionFolderPath";
+const wchar_t* const kModeLocal = L"LOCAL";
+const wchar_t* const kModeA2A = L"A2A";
+const wchar_t* const kModeOther = L"OTHER";
+const wchar_t* const kTaskTimeUri = L"data:/Auto/SystemMenu/TaskTimeEdit";
+const wchar_t* const kUpdateTmpFileDefault = L"../../Data/User/OnLineUpdate/PreparateurTmp.xml";
+const wchar_t* const kUpdateTmpFileUri = L"data:/Configuration/MenuBar/PreparateurConfigFileTmp";
 
 const wchar_t* const kUsersFileDefault = L"../../Data/User/FicheDiagParams.xml";
 const wchar_t* const kUsersFileUri = L"data:/Configuration/DoC/FicheDiagnostic/FicheDiagParamsFileName";
@@ -50,6 +64,9 @@ const wchar_t* const kBTextID = L"tessel:BText?BText";
 const wchar_t* const kMessageBoxManagerID = L"tessel:Navigation?MessageBoxManager";
 const wchar_t* const kUpdateAgentID = L"proc:ProcStartUpdateAgent?ProcStartUpdateAgent";
 const wchar_t* const kWatcherID = L"util:FileSystemUtilities?CQ17FileSystemWatcher";
+const wchar_t* const kMediatorID = L"gui:GuiToolConfiguration?MedToolConfiguration#ToolConfiguaration.ui";
+const wchar_t* const kUserSetUri = L"data:/Auto/SystemMenu/Users/UserSet";
+const wchar_t* const kEnableOnlineUpdateUri = L"data:/Configuration/MenuBar/EnableOnlineUpdate";
 
 void trace(const wchar_t* message)
 {
@@ -75,6 +92,15 @@ ACE_WString toWide(const QString& text)
 QString toQString(const ACE_WString& text)
 {
     return QString::fromWCharArray(text.c_str(), static_cast<qsizetype>(text.length()));
+}
+
+// The App2App server's repository share: \\<address>\TLD_REPOSITORY.
+ACE_WString app2AppSharePath(const ACE_WString& address)
+{
+    ACE_WString path(L"\\\\");
+    path += address;
+    path += L"\\TLD_REPOSITORY";
+    return path;
 }
 
 // The brand number right-justified to four characters with '0'; longer keys stay as they are.
@@ -242,10 +268,8 @@ void ToolConfigurationCommand::handleEvent(const CustomEvent& event)
 
 void ToolConfigurationCommand::refreshUsersListData()
 {
-    // USERS LIST: the users command republishes the user set from the users file here:
-    //   UsersCommand usersCommand(QString("WC_USERSCOMMAND"));
-    //   usersCommand.createDMUsersData();
-    // It arrives with the users dialog; until then the users list is not republished.
+    UsersCommand usersCommand(QString("WC_USERSCOMMAND"));
+    usersCommand.createDMUsersData();
 }
 
 void ToolConfigurationCommand::createDMData(bool reset)
@@ -566,7 +590,54 @@ void ToolConfigurationCommand::createDataForCombo(const ACE_WString& name)
 void ToolConfigurationCommand::createDataForUpdateRadioButtons()
 {
     trace(L"[ToolConfigurationCommand::createDataForUpdateRadioButtons] : Method started");
-    // The radio buttons and the mode's distribution folder come with the update-mode work.
+    if (!m_dataManager.isAvailable() || m_pUpdateUpdater == nullptr)
+        return;
+
+    const ACE_WString mode = m_pUpdateUpdater->getDeploymentMode();
+    if (mode == kModeLocal)
+    {
+        setRadioButtonState(L"LocalRadioButton", true);
+        setRadioButtonState(L"A2ARadioButton", false);
+        setRadioButtonState(L"OtherRadioButton", false);
+        updateDataForControl(kDistributionFolder, m_pUpdateUpdater->getLocalDistributionFolderPath(), true);
+    }
+    else if (mode == kModeA2A)
+    {
+        setRadioButtonState(L"LocalRadioButton", false);
+        setRadioButtonState(L"A2ARadioButton", true);
+        setRadioButtonState(L"OtherRadioButton", false);
+        updateDataForControl(kDistributionFolder, app2AppSharePath(m_app2AppIP), true);
+    }
+    else if (mode == kModeOther)
+    {
+        setRadioButtonState(L"LocalRadioButton", false);
+        setRadioButtonState(L"A2ARadioButton", false);
+        setRadioButtonState(L"OtherRadioButton", true);
+        updateDataForControl(kDistributionFolder, m_pUpdateUpdater->getDistributionFolderPath(), false);
+    }
+    // Any other mode leaves the radio buttons and the folder record as they are.
+}
+
+void ToolConfigurationCommand::setRadioButtonState(ACE_WString name, bool state)
+{
+    if (!m_dataManager.isAvailable())
+        return;
+    m_dataManager->createData(controlUri(name), BBool(state));
+}
+
+void ToolConfigurationCommand::validateIP(ACE_WString& ip)
+{
+    const QStringList parts = toQString(ip).split(QLatin1Char('.'), Qt::KeepEmptyParts);
+    QString result;
+    for (qsizetype i = 0; i < parts.size(); ++i)
+    {
+        bool ok = false;
+        const int value = parts[i].toInt(&ok, 10);
+        result += ok ? QString::number(value) : QStringLiteral("0");
+        if (i + 1 < parts.size())
+            result += QLatin1Char('.');
+    }
+    ip = toWide(result);
 }
 
 // ---------------------------------------------------------------------------------------------
@@ -691,56 +762,233 @@ void ToolConfigurationCommand::onButtonSaveLogsClicked()
 // Update-mode, scheduling, OK and Cancel slots: their behaviour comes with the update-mode and
 // commit work; until then each only writes its entry line.
 
-void ToolConfigurationCommand::onRecordingModeChecked(bool)
+void ToolConfigurationCommand::onRecordingModeChecked(bool bChecked)
 {
     trace(L"[ToolConfigurationCommand::onRecordingModeChecked] : Method started");
+    if (!m_dataManager.isAvailable())
+        return;
+    const ID uri = controlUri(ACE_WString(L"ASRMChk"));
+    // Keeps the value from before this change.
+    m_dataManager->getBool(uri, m_bRecordingMode);
+    m_dataManager->setData(uri, BBool(bChecked));
 }
 
 void ToolConfigurationCommand::onOKButtonClicked()
 {
     trace(L"[ToolConfigurationCommand::onOKButtonClicked] : Method started");
+
+    if (m_dataManager.isAvailable())
+        m_dataManager->getBool(controlUri(L"ASRMChk"), m_bRecordingMode);
+    TesselLog_Static::setLevel_static(m_bRecordingMode ? 10 : 0);
+
+    if (m_pWorkshopInfoUpdater != nullptr && !m_pWorkshopInfoUpdater->save())
+        warning(L"[ToolConfigurationCommand::onOKButtonClicked] : Cannot save workshop data!");
+
+    if (m_dataManager.isAvailable())
+        saveUsersAndApp2App();
+
+    if (m_pUpdateUpdater != nullptr)
+        saveOnlineUpdateAndTask();
+
+    SmartProxy<PMediator> mediator;
+    if (mediator.acquire(ID(kMediatorID)))
+        mediator->closeDialog();
 }
 
 void ToolConfigurationCommand::onCancelButtonClicked()
 {
+    SmartProxy<PMediator> mediator;
+    if (mediator.acquire(ID(kMediatorID)))
+        mediator->closeDialog();
+
+    createDMData(true);
+
+    {
+        UsersCommand usersCommand(QString("WC_USERSCOMMAND"));
+        usersCommand.createDMUsersData();
+    }
+    mediator.giveBack();
 }
 
 void ToolConfigurationCommand::onFolderBrowserButtonClicked()
 {
     trace(L"[ToolConfigurationCommand::onFolderBrowserButtonClicked] : Method started");
+    const QString chosen = QFileDialog::getExistingDirectory(
+        nullptr, QStringLiteral("Choose a directory"), QStringLiteral("/home"), QFileDialog::ShowDirsOnly);
+    if (m_pUpdateUpdater == nullptr || !m_dataManager.isAvailable())
+        return;
+    const ACE_WString path = toWide(chosen);
+    if (path.is_empty())
+        return;
+    updateDataForControl(kDistributionFolder, path);
+    m_pUpdateUpdater->setDistributionFolderPath(path);
 }
 
-void ToolConfigurationCommand::onCheckInternetChecked(bool)
+void ToolConfigurationCommand::onCheckInternetChecked(bool bChecked)
 {
     trace(L"[ToolConfigurationCommand::onCheckInternetChecked] : Method started");
+    if (m_pUpdateUpdater == nullptr || !m_dataManager.isAvailable())
+        return;
+    m_pUpdateUpdater->setCheckInternet(bChecked);
+    m_dataManager->setData(controlUri(ACE_WString(L"CheckInternet")), BBool(bChecked));
 }
 
 void ToolConfigurationCommand::onLocalRadioButtonClicked()
 {
     trace(L"[ToolConfigurationCommand::onLocalRadioButtonClicked] : Method started");
+    if (m_pUpdateUpdater == nullptr || !m_dataManager.isAvailable())
+        return;
+    m_pUpdateUpdater->setDeploymentMode(kModeLocal);
+    setRadioButtonState(L"LocalRadioButton", true);
+    setRadioButtonState(L"A2ARadioButton", false);
+    setRadioButtonState(L"OtherRadioButton", false);
+    updateDataForControl(kDistributionFolder, m_pUpdateUpdater->getLocalDistributionFolderPath(), true);
 }
 
 void ToolConfigurationCommand::onA2ARadioButtonClicked()
 {
     trace(L"[ToolConfigurationCommand::onA2ARadioButtonClicked] : Method started");
+    if (m_pUpdateUpdater == nullptr || !m_dataManager.isAvailable())
+        return;
+    m_pUpdateUpdater->setDeploymentMode(kModeA2A);
+    setRadioButtonState(L"LocalRadioButton", false);
+    setRadioButtonState(L"A2ARadioButton", true);
+    setRadioButtonState(L"OtherRadioButton", false);
+    const ACE_WString sharePath = app2AppSharePath(m_app2AppIP);
+    updateDataForControl(kDistributionFolder, sharePath, true);
+    m_pUpdateUpdater->setDistributionFolderPath(sharePath);
 }
 
 void ToolConfigurationCommand::onOtherRadioButtonClicked()
 {
     trace(L"[ToolConfigurationCommand::onOtherRadioButtonClicked] : Method started");
+    if (m_pUpdateUpdater == nullptr || !m_dataManager.isAvailable())
+        return;
+    m_pUpdateUpdater->setDeploymentMode(kModeOther);
+    setRadioButtonState(L"LocalRadioButton", false);
+    setRadioButtonState(L"A2ARadioButton", false);
+    setRadioButtonState(L"OtherRadioButton", true);
+    updateDataForControl(kDistributionFolder, m_pUpdateUpdater->getDistributionFolderPath(), false);
 }
 
-void ToolConfigurationCommand::onDistributionFolderPathChanged(QString)
+void ToolConfigurationCommand::onDistributionFolderPathChanged(QString qstrValue)
 {
     trace(L"[ToolConfigurationCommand::onDistributionFolderPathChanged] : Method started");
+    if (m_pUpdateUpdater == nullptr || !m_dataManager.isAvailable())
+        return;
+    const ACE_WString text = toWide(qstrValue);
+    updateDataForControl(kDistributionFolder, text);
+    m_pUpdateUpdater->setDistributionFolderPath(text);
 }
 
-void ToolConfigurationCommand::onTaskTimeEditChanged(const QTime&)
+void ToolConfigurationCommand::onTaskTimeEditChanged(const QTime& taksTime)
 {
     trace(L"[ToolConfigurationCommand::onTaskTimeEditChanged] : Method started");
+    // hh:mm:ss; an invalid time gives the empty text.
+    const ACE_WString text = toWide(taksTime.toString(Qt::TextDate));
+    if (m_pUpdateUpdater != nullptr)
+        m_pUpdateUpdater->setTaskTime(text);
+    if (m_dataManager.isAvailable())
+        m_dataManager->setData(ID(kTaskTimeUri), BString(text));
 }
 
 void ToolConfigurationCommand::onConfigurationTestButtonClicked()
 {
     trace(L"[ToolConfigurationCommand::onConfigurationTestButtonClicked] : Method started");
+    ACE_WString tmpPath(kUpdateTmpFileDefault);
+    if (m_dataManager.isAvailable())
+    {
+        m_dataManager->getString(ID(kUpdateTmpFileUri), tmpPath);
+        if (tmpPath.is_empty())
+            tmpPath = kUpdateTmpFileDefault;
+    }
+    if (m_pUpdateUpdater != nullptr)
+        m_pUpdateUpdater->save(tmpPath);
+    if (m_dataManager.isAvailable())
+        m_dataManager->setString(controlUri(ACE_WString(kActivePreparateur)), tmpPath);
+
+    OnLineUpdateCommand onLineUpdateCommand(QStringLiteral("WC_ONLINEUPDATECOMMAND"));
+    onLineUpdateCommand.init();
+}
+
+// ---------------------------------------------------------------------------------------------
+// OK helpers
+
+void ToolConfigurationCommand::saveUsersAndApp2App()
+{
+    ACE_Guard<ACE_Thread_Mutex> guard(m_storesMutex);
+
+    BSet userSet(10);
+    m_dataManager->getData(ID(kUserSetUri), userSet);
+    if (m_pUsersUpdater == nullptr)
+        return;
+
+    m_pUsersUpdater->removeAllUsers();
+    for (int i = 0; i < userSet.size(); ++i)
+    {
+        BSet user(10);
+        userSet.getSet(StringUtilities::wideSprintf(L"User#%d", i), user);
+        ACE_WString name;
+        ACE_WString address;
+        ACE_WString phone;
+        user.getString(L"name", name);
+        user.getString(L"address", address);
+        user.getString(L"phone", phone);
+        m_pUsersUpdater->addUser(name, address, phone);
+    }
+
+    ACE_WString port;
+    ACE_WString ip;
+    ACE_WString dealerId;
+    m_app2AppValues.getString(L"App2AppPort", port);
+    m_app2AppValues.getString(L"App2AppIP", ip);
+    m_app2AppValues.getString(L"App2AppDealerID", dealerId);
+
+    const ACE_WString typedIp = ip;
+    validateIP(ip);
+    if (ip != typedIp)
+        updateDataForControl(L"App2AppIP", ip);
+
+    m_pUsersUpdater->setApp2AppParams(port, ip, dealerId);
+    if (!m_pUsersUpdater->save())
+        warning(L"[ToolConfigurationCommand::onOKButtonClicked] : Cannot save users data!");
+}
+
+void ToolConfigurationCommand::saveOnlineUpdateAndTask()
+{
+    std::unique_ptr<OnLineUpdateCommand> onLineUpdate;
+    {
+        ACE_Guard<ACE_Thread_Mutex> guard(m_storesMutex);
+
+        ACE_WString path;
+        if (m_dataManager.isAvailable())
+            m_dataManager->getString(ID(kUpdateFileUri), path);
+        if (path.is_empty())
+            path = kUpdateFileDefault;
+        if (!m_pUpdateUpdater->save(path))
+            warning(L"[ToolConfigurationCommand::onOKButtonClicked] : Cannot save Preparateur data!");
+        else if (m_dataManager.isAvailable())
+            // A configuration test left the active path on its temporary copy; the saved file
+            // is what a later rebuild must read.
+            m_dataManager->setString(controlUri(ACE_WString(kActivePreparateur)), path);
+
+        onLineUpdate = std::make_unique<OnLineUpdateCommand>(QString("WC_TOOLCONFIGURATION"));
+        const bool enabled = m_pUpdateUpdater->getCheckInternet();
+        if (m_dataManager.isAvailable())
+            m_dataManager->setBool(ID(kEnableOnlineUpdateUri), enabled);
+
+        if (enabled)
+        {
+            if (!onLineUpdate->CreateScheduledTask())
+                warning(L"[ToolConfigurationCommand::onOKButtonClicked] : The scheduller task for starting of the "
+                        L"Preparateur module has not been created!");
+        }
+        else if (!onLineUpdate->DeleteScheduledTask())
+        {
+            warning(L"[ToolConfigurationCommand::onOKButtonClicked] : The scheduller task for starting of the "
+                    L"Preparateur module has not been deleted!");
+        }
+    }
+    // The command goes only once the lock is released.
+    onLineUpdate.reset();
 }
