@@ -5,7 +5,6 @@
 #include "LogCapture.h"
 #include "PToolConfigControllersFactory.h"
 #include "SmartProxy.h"
-#include "UsersCommand.h"
 #include "WidgetCommandBase.h"
 
 #include <gtest/gtest.h>
@@ -76,16 +75,32 @@ TEST(FactoryTest, UnknownAndWrongCaseNamesGiveNoController)
     }
 }
 
-TEST(FactoryTest, UsersCommandNameGivesANewControllerOnEveryCall)
+struct ControllerCase
+{
+    const wchar_t* name;
+    const char* className;
+};
+
+class FactoryControllerTest : public ::testing::TestWithParam<ControllerCase>
+{
+};
+
+TEST_P(FactoryControllerTest, KnownNameGivesANewControllerOnEveryCall)
 {
     CToolConfigControllersFactory factory{ID(kFactoryID)};
-    std::unique_ptr<WidgetCommandBase> first(factory.getControllerByName(ACE_WString(L"WC_USERSCOMMAND")));
-    std::unique_ptr<WidgetCommandBase> second(factory.getControllerByName(ACE_WString(L"WC_USERSCOMMAND")));
-    ASSERT_NE(dynamic_cast<UsersCommand*>(first.get()), nullptr);
-    ASSERT_NE(dynamic_cast<UsersCommand*>(second.get()), nullptr);
+    const ACE_WString name(GetParam().name);
+    std::unique_ptr<WidgetCommandBase> first(factory.getControllerByName(name));
+    std::unique_ptr<WidgetCommandBase> second(factory.getControllerByName(name));
+    ASSERT_NE(first, nullptr);
+    ASSERT_NE(second, nullptr);
     EXPECT_NE(first.get(), second.get());
-    EXPECT_EQ(first->getCommandID(), QString("WC_USERSCOMMAND"));
+    EXPECT_STREQ(first->metaObject()->className(), GetParam().className);
+    EXPECT_EQ(first->getCommandID(), QString::fromWCharArray(GetParam().name));
 }
+
+INSTANTIATE_TEST_SUITE_P(Names, FactoryControllerTest,
+                         ::testing::Values(ControllerCase{L"WC_TOOLCONFIGURATION", "ToolConfigurationCommand"},
+                                           ControllerCase{L"WC_USERSCOMMAND", "UsersCommand"}));
 
 TEST(FactoryTest, LifecycleWritesItsTraceLines)
 {
