@@ -373,6 +373,11 @@ struct AddCase
     User stored;
 };
 
+void PrintTo(const AddCase& c, std::ostream* out)
+{
+    *out << c.label;
+}
+
 class UsersAddTest : public UsersCommandTest, public ::testing::WithParamInterface<AddCase>
 {
 };
@@ -506,6 +511,11 @@ struct DeleteCase
     const char* answer;
     std::vector<User> after;
 };
+
+void PrintTo(const DeleteCase& c, std::ostream* out)
+{
+    *out << c.label;
+}
 
 class UsersDeleteTest : public UsersCommandTest, public ::testing::WithParamInterface<DeleteCase>
 {
