@@ -369,8 +369,10 @@ TEST_F(ToolConfigurationTest, PublishesEditRecordsFromTheStores)
 
 TEST_F(ToolConfigurationTest, UpdateStoreDefaultsReachTheDialog)
 {
+    // Mode "OTHER" shows the store's own (defaulted) distribution folder.
     BSet set(10);
     set.setBool(L"OnlineUpdateActivated", true);
+    set.setString(L"DeploymentMode", L"OTHER");
     save(set, m_updatePath);
     makeCommand();
     EXPECT_EQ(publishedString("TaskTimeEdit"), "11:00:00");
