@@ -29,6 +29,7 @@ public:
     static bool recordingMode(ToolConfigurationCommand& c) { return c.m_bRecordingMode; }
     static void setRecordingMode(ToolConfigurationCommand& c, bool on) { c.m_bRecordingMode = on; }
     static void createDMData(ToolConfigurationCommand& c, bool reset) { c.createDMData(reset); }
+    static void validateIP(ToolConfigurationCommand& c, ACE_WString& ip) { c.validateIP(ip); }
     static void handleEvent(ToolConfigurationCommand& c, const CustomEvent& e) { c.handleEvent(e); }
     static bool messageBoxAcquired(ToolConfigurationCommand& c) { return c.m_messageBoxManager.isAvailable(); }
     static bool textAcquired(ToolConfigurationCommand& c) { return c.m_bText.isAvailable(); }

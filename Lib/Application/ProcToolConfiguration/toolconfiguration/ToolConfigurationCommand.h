@@ -104,6 +104,9 @@ private:
 
     // Update-mode controls.
     void createDataForUpdateRadioButtons();
+    void setRadioButtonState(ACE_WString name, bool state);
+    // Each dotted part becomes its decimal value, or 0 when it is not a number.
+    void validateIP(ACE_WString& ip);
 
     // Helpers shared by the operations above.
     ACE_WString readConfigString(const ACE_WString& uri);
@@ -122,6 +125,11 @@ private:
     BSet m_app2AppValues;
     ACE_Thread_Mutex m_storesMutex;
     SmartProxy<PQ17FileSystemWatcher> m_fileSystemWatcher;
+
+    // OK: the users and App2App part of the users file, then the online-update settings and
+    // the scheduled task, each under the stores' lock.
+    void saveUsersAndApp2App();
+    void saveOnlineUpdateAndTask();
 
     friend class ToolConfigurationCommandTestAccess;
 };
