@@ -23,6 +23,7 @@
 
 #include <unistd.h>
 
+#include <cctype>
 #include <filesystem>
 #include <string>
 #include <vector>
@@ -568,5 +569,12 @@ INSTANTIATE_TEST_SUITE_P(Table, ValidateIP,
                                            IpCase{"1..2", "1.0.2"}, IpCase{"1.", "1.0"}, IpCase{"", "0"},
                                            IpCase{"300.1.1.1", "300.1.1.1"}, IpCase{"1.2", "1.2"},
                                            IpCase{"-5.+7. 8 .9", "-5.7.8.9"}, IpCase{"99999999999.1", "0.1"},
-                                           IpCase{"0x10.1", "0.1"}));
+                                           IpCase{"0x10.1", "0.1"}),
+                         [](const ::testing::TestParamInfo<IpCase>& info) {
+                             std::string name = info.param.in;
+                             for (char& ch : name)
+                                 if (!std::isalnum(static_cast<unsigned char>(ch)))
+                                     ch = '_';
+                             return name.empty() ? std::string("Empty") : "In_" + name;
+                         });
 }
