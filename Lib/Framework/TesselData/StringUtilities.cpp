@@ -25,8 +25,8 @@ enum class Length
     eBIG_L
 };
 
-// One conversion spec, as read from the format.
-struct Spec
+// One conversion directive, as read from the format.
+struct Directive
 {
     std::string flags;
     int width = -1;
@@ -38,13 +38,13 @@ struct Spec
 
 // Formats a single numeric conversion with the C library; never truncates.
 template <typename T>
-void appendNumber(std::wstring& out, const Spec& spec, const char* lengthText, char conversion, T value)
+void appendNumber(std::wstring& out, const Directive& directive, const char* lengthText, char conversion, T value)
 {
-    std::string format = "%" + spec.flags;
-    if (spec.width >= 0)
-        format += std::to_string(spec.width);
-    if (spec.precision >= 0)
-        format += "." + std::to_string(spec.precision);
+    std::string format = "%" + directive.flags;
+    if (directive.width >= 0)
+        format += std::to_string(directive.width);
+    if (directive.precision >= 0)
+        format += "." + std::to_string(directive.precision);
     format += lengthText;
     format += conversion;
     const int needed = std::snprintf(nullptr, 0, format.c_str(), value);
@@ -57,12 +57,12 @@ void appendNumber(std::wstring& out, const Spec& spec, const char* lengthText, c
         out.push_back(static_cast<wchar_t>(static_cast<unsigned char>(c)));
 }
 
-// Pads `text` to the spec's width (in characters); "-" pads on the right.
-void appendPadded(std::wstring& out, const Spec& spec, const std::wstring& text)
+// Pads `text` to the directive's width (in characters); "-" pads on the right.
+void appendPadded(std::wstring& out, const Directive& directive, const std::wstring& text)
 {
-    const std::size_t width = spec.width > 0 ? static_cast<std::size_t>(spec.width) : 0;
+    const std::size_t width = directive.width > 0 ? static_cast<std::size_t>(directive.width) : 0;
     const std::size_t padding = text.size() < width ? width - text.size() : 0;
-    const bool left = spec.flags.find('-') != std::string::npos;
+    const bool left = directive.flags.find('-') != std::string::npos;
     if (!left)
         out.append(padding, L' ');
     out += text;
@@ -135,20 +135,20 @@ std::wstring formatWith(const Char* format, va_list args)
             break;
         const Char* specStart = p;
         ++p; // '%'
-        Spec spec;
+        Directive directive;
         while (*p == '-' || *p == '+' || *p == ' ' || *p == '#' || *p == '0' || *p == '\'')
         {
-            if (spec.flags.find(static_cast<char>(*p)) == std::string::npos)
-                spec.flags.push_back(static_cast<char>(*p));
+            if (directive.flags.find(static_cast<char>(*p)) == std::string::npos)
+                directive.flags.push_back(static_cast<char>(*p));
             ++p;
         }
         if (*p == '*')
         {
-            spec.width = va_arg(ap, int);
-            if (spec.width < 0)
+            directive.width = va_arg(ap, int);
+            if (directive.width < 0)
             {
-                spec.flags.push_back('-');
-                spec.width = -spec.width;
+                directive.flags.push_back('-');
+                directive.width = -directive.width;
             }
             ++p;
         }
@@ -156,28 +156,28 @@ std::wstring formatWith(const Char* format, va_list args)
         {
             while (isDigit(static_cast<wchar_t>(*p)))
             {
-                spec.width = (spec.width < 0 ? 0 : spec.width) * 10 + static_cast<int>(*p - '0');
-                if (spec.width > 100000)
-                    spec.width = 100000;
+                directive.width = (directive.width < 0 ? 0 : directive.width) * 10 + static_cast<int>(*p - '0');
+                if (directive.width > 100000)
+                    directive.width = 100000;
                 ++p;
             }
         }
         if (*p == '.')
         {
             ++p;
-            spec.precision = 0;
+            directive.precision = 0;
             if (*p == '*')
             {
-                spec.precision = va_arg(ap, int);
+                directive.precision = va_arg(ap, int);
                 ++p;
             }
             else
             {
                 while (isDigit(static_cast<wchar_t>(*p)))
                 {
-                    spec.precision = spec.precision * 10 + static_cast<int>(*p - '0');
-                    if (spec.precision > 100000)
-                        spec.precision = 100000;
+                    directive.precision = directive.precision * 10 + static_cast<int>(*p - '0');
+                    if (directive.precision > 100000)
+                        directive.precision = 100000;
                     ++p;
                 }
             }
@@ -186,45 +186,45 @@ std::wstring formatWith(const Char* format, va_list args)
         if (*p == 'h')
         {
             ++p;
-            spec.length = Length::eH;
-            spec.narrowModifier = true;
+            directive.length = Length::eH;
+            directive.narrowModifier = true;
             if (*p == 'h')
             {
                 ++p;
-                spec.length = Length::eHH;
+                directive.length = Length::eHH;
             }
         }
         else if (*p == 'l')
         {
             ++p;
-            spec.length = Length::eL;
-            spec.wideModifier = true;
+            directive.length = Length::eL;
+            directive.wideModifier = true;
             if (*p == 'l')
             {
                 ++p;
-                spec.length = Length::eLL;
+                directive.length = Length::eLL;
             }
         }
         else if (*p == 'w')
         {
             ++p;
-            spec.wideModifier = true;
+            directive.wideModifier = true;
         }
         else if (*p == 'q' || *p == 'L')
         {
-            spec.length = *p == 'q' ? Length::eLL : Length::eBIG_L;
+            directive.length = *p == 'q' ? Length::eLL : Length::eBIG_L;
             ++p;
         }
         else if (*p == 'j' || *p == 'z' || *p == 't')
         {
-            spec.length = *p == 'j' ? Length::eJ : (*p == 'z' ? Length::eZ : Length::eT);
+            directive.length = *p == 'j' ? Length::eJ : (*p == 'z' ? Length::eZ : Length::eT);
             ++p;
         }
         else if (*p == 'I')
         {
             if (p[1] == '6' && p[2] == '4')
             {
-                spec.length = Length::eLL;
+                directive.length = Length::eLL;
                 p += 3;
             }
             else if (p[1] == '3' && p[2] == '2')
@@ -233,7 +233,7 @@ std::wstring formatWith(const Char* format, va_list args)
             }
             else
             {
-                spec.length = Length::eZ;
+                directive.length = Length::eZ;
                 ++p;
             }
         }
@@ -243,31 +243,31 @@ std::wstring formatWith(const Char* format, va_list args)
         {
         case 'd':
         case 'i':
-            switch (spec.length)
+            switch (directive.length)
             {
             case Length::eHH:
-                appendNumber(out, spec, "hh", 'd', static_cast<signed char>(va_arg(ap, int)));
+                appendNumber(out, directive, "hh", 'd', static_cast<signed char>(va_arg(ap, int)));
                 break;
             case Length::eH:
-                appendNumber(out, spec, "h", 'd', static_cast<short>(va_arg(ap, int)));
+                appendNumber(out, directive, "h", 'd', static_cast<short>(va_arg(ap, int)));
                 break;
             case Length::eL:
-                appendNumber(out, spec, "l", 'd', va_arg(ap, long));
+                appendNumber(out, directive, "l", 'd', va_arg(ap, long));
                 break;
             case Length::eLL:
-                appendNumber(out, spec, "ll", 'd', va_arg(ap, long long));
+                appendNumber(out, directive, "ll", 'd', va_arg(ap, long long));
                 break;
             case Length::eJ:
-                appendNumber(out, spec, "j", 'd', va_arg(ap, intmax_t));
+                appendNumber(out, directive, "j", 'd', va_arg(ap, intmax_t));
                 break;
             case Length::eZ:
-                appendNumber(out, spec, "z", 'd', va_arg(ap, ssize_t));
+                appendNumber(out, directive, "z", 'd', va_arg(ap, ssize_t));
                 break;
             case Length::eT:
-                appendNumber(out, spec, "t", 'd', va_arg(ap, ptrdiff_t));
+                appendNumber(out, directive, "t", 'd', va_arg(ap, ptrdiff_t));
                 break;
             default:
-                appendNumber(out, spec, "", 'd', va_arg(ap, int));
+                appendNumber(out, directive, "", 'd', va_arg(ap, int));
                 break;
             }
             break;
@@ -277,31 +277,31 @@ std::wstring formatWith(const Char* format, va_list args)
         case 'o':
         {
             const char c = static_cast<char>(conversion);
-            switch (spec.length)
+            switch (directive.length)
             {
             case Length::eHH:
-                appendNumber(out, spec, "hh", c, static_cast<unsigned char>(va_arg(ap, unsigned int)));
+                appendNumber(out, directive, "hh", c, static_cast<unsigned char>(va_arg(ap, unsigned int)));
                 break;
             case Length::eH:
-                appendNumber(out, spec, "h", c, static_cast<unsigned short>(va_arg(ap, unsigned int)));
+                appendNumber(out, directive, "h", c, static_cast<unsigned short>(va_arg(ap, unsigned int)));
                 break;
             case Length::eL:
-                appendNumber(out, spec, "l", c, va_arg(ap, unsigned long));
+                appendNumber(out, directive, "l", c, va_arg(ap, unsigned long));
                 break;
             case Length::eLL:
-                appendNumber(out, spec, "ll", c, va_arg(ap, unsigned long long));
+                appendNumber(out, directive, "ll", c, va_arg(ap, unsigned long long));
                 break;
             case Length::eJ:
-                appendNumber(out, spec, "j", c, va_arg(ap, uintmax_t));
+                appendNumber(out, directive, "j", c, va_arg(ap, uintmax_t));
                 break;
             case Length::eZ:
-                appendNumber(out, spec, "z", c, va_arg(ap, size_t));
+                appendNumber(out, directive, "z", c, va_arg(ap, size_t));
                 break;
             case Length::eT:
-                appendNumber(out, spec, "t", c, va_arg(ap, ptrdiff_t));
+                appendNumber(out, directive, "t", c, va_arg(ap, ptrdiff_t));
                 break;
             default:
-                appendNumber(out, spec, "", c, va_arg(ap, unsigned int));
+                appendNumber(out, directive, "", c, va_arg(ap, unsigned int));
                 break;
             }
             break;
@@ -314,14 +314,14 @@ std::wstring formatWith(const Char* format, va_list args)
         case 'G':
         case 'a':
         case 'A':
-            if (spec.length == Length::eBIG_L)
-                appendNumber(out, spec, "L", static_cast<char>(conversion), va_arg(ap, long double));
+            if (directive.length == Length::eBIG_L)
+                appendNumber(out, directive, "L", static_cast<char>(conversion), va_arg(ap, long double));
             else
-                appendNumber(out, spec, "", static_cast<char>(conversion), va_arg(ap, double));
+                appendNumber(out, directive, "", static_cast<char>(conversion), va_arg(ap, double));
             break;
         case 'p':
         {
-            Spec pointerSpec = spec;
+            Directive pointerSpec = directive;
             pointerSpec.precision = -1;
             appendNumber(out, pointerSpec, "", 'p', va_arg(ap, void*));
             break;
@@ -330,23 +330,23 @@ std::wstring formatWith(const Char* format, va_list args)
         case 'S':
         {
             bool wide = (conversion == 's') == wideFormat;
-            if (spec.wideModifier)
+            if (directive.wideModifier)
                 wide = true;
-            else if (spec.narrowModifier)
+            else if (directive.narrowModifier)
                 wide = false;
             if (wide)
-                appendPadded(out, spec, wideArgument(va_arg(ap, const wchar_t*), spec.precision));
+                appendPadded(out, directive, wideArgument(va_arg(ap, const wchar_t*), directive.precision));
             else
-                appendPadded(out, spec, narrowArgument(va_arg(ap, const char*), spec.precision));
+                appendPadded(out, directive, narrowArgument(va_arg(ap, const char*), directive.precision));
             break;
         }
         case 'c':
         case 'C':
         {
             bool wide = (conversion == 'c') == wideFormat;
-            if (spec.wideModifier)
+            if (directive.wideModifier)
                 wide = true;
-            else if (spec.narrowModifier)
+            else if (directive.narrowModifier)
                 wide = false;
             wchar_t c = 0;
             if (wide)
@@ -356,7 +356,7 @@ std::wstring formatWith(const Char* format, va_list args)
                 const auto byte = static_cast<unsigned char>(va_arg(ap, int));
                 c = byte < 0x80 ? static_cast<wchar_t>(byte) : Utf8Codec::kReplacement;
             }
-            appendPadded(out, spec, std::wstring(1, c));
+            appendPadded(out, directive, std::wstring(1, c));
             break;
         }
         case 'n':
