@@ -65,36 +65,36 @@ protected:
         return proxy;
     }
 
+    // Counts destroyed test components; declared first so it outlives the manager's teardown.
+    std::atomic<int> m_destroyed{0};
     ManagerHold m_manager;
     int m_baseProxies = 0;
 };
 
 TEST_F(ComponentManagerTest, RegistrationRefusesDuplicatesAndMissingParts)
 {
-    std::atomic<int> destroyed{0};
-    auto first = std::make_unique<RecordingComponent>("test:Unit?A", &destroyed);
+    auto first = std::make_unique<RecordingComponent>("test:Unit?A", &m_destroyed);
     IComponent* registered = first.get();
     ASSERT_EQ(m_manager->registerComponent(std::move(first), recordingProxyFactory()), IComponentManager::eOK);
 
     LogCapture log;
-    EXPECT_EQ(m_manager->registerComponent(std::make_unique<RecordingComponent>("test:Unit?A", &destroyed),
+    EXPECT_EQ(m_manager->registerComponent(std::make_unique<RecordingComponent>("test:Unit?A", &m_destroyed),
                                            recordingProxyFactory()),
               IComponentManager::eALREADY_REGISTERED);
-    EXPECT_EQ(destroyed, 1) << "the refused duplicate is destroyed";
+    EXPECT_EQ(m_destroyed, 1) << "the refused duplicate is destroyed";
     EXPECT_TRUE(log.containsSubstring("test:Unit?A", TesselLog_Static::eERROR));
     EXPECT_EQ(m_manager->getComponent(ID("test:Unit?A")), registered);
 
     EXPECT_EQ(m_manager->registerComponent(nullptr, recordingProxyFactory()), IComponentManager::eNULL_ARGUMENT);
-    EXPECT_EQ(m_manager->registerComponent(std::make_unique<RecordingComponent>("test:Unit?B", &destroyed), nullptr),
+    EXPECT_EQ(m_manager->registerComponent(std::make_unique<RecordingComponent>("test:Unit?B", &m_destroyed), nullptr),
               IComponentManager::eNULL_ARGUMENT);
-    EXPECT_EQ(destroyed, 2);
+    EXPECT_EQ(m_destroyed, 2);
     EXPECT_FALSE(m_manager->hasComponent(ID("test:Unit?B")));
 }
 
 TEST_F(ComponentManagerTest, DestroyedEventReachesOnlyTheProxiesOfThatComponent)
 {
-    std::atomic<int> destroyed{0};
-    ASSERT_EQ(m_manager->registerComponent(std::make_unique<RecordingComponent>("test:Unit?A", &destroyed),
+    ASSERT_EQ(m_manager->registerComponent(std::make_unique<RecordingComponent>("test:Unit?A", &m_destroyed),
                                            recordingProxyFactory()),
               0);
     ASSERT_EQ(m_manager->registerComponent(std::make_unique<RecordingComponent>("test:Unit?B"), recordingProxyFactory()),
@@ -107,7 +107,7 @@ TEST_F(ComponentManagerTest, DestroyedEventReachesOnlyTheProxiesOfThatComponent)
     EXPECT_EQ(m_manager->getLiveProxyCount(), m_baseProxies + 3);
 
     ASSERT_EQ(m_manager->destroyComponent(ID("test:Unit?A")), IComponentManager::eOK);
-    EXPECT_EQ(destroyed, 1);
+    EXPECT_EQ(m_destroyed, 1);
     EXPECT_FALSE(m_manager->hasComponent(ID("test:Unit?A")));
     for (RecordingProxy* proxy : {a1, a2})
     {
