@@ -48,16 +48,17 @@ TEST_P(TaskTimeTest, TimeIsCutIntoHourAndMinuteTexts)
     EXPECT_EQ(u(params.startHour()), GetParam().hour);
     EXPECT_EQ(u(params.startMinute()), GetParam().minute);
     EXPECT_EQ(params.isValid(), GetParam().valid);
+    EXPECT_EQ(m_log.containsSubstring("- invalid setting"), std::string(GetParam().time).size() < 5);
     EXPECT_FALSE(m_log.containsSubstring("will attempt to init"));
 }
 
-// Texts shorter than "hh:mm" give what they hold; an empty minute makes the settings invalid.
+// Texts shorter than "hh:mm" are invalid settings: the empty default parameters come back.
 const TimeCase kTimeCases[] = {
     {"Full", "07:30:00", "07", "30", true},
     {"NoSeconds", "07:30", "07", "30", true},
-    {"SingleDigitHour", "7:30", "7:", "0", true},
-    {"ThreeCharacters", "7:3", "7:", "", false},
-    {"HourOnly", "7", "7", "", false},
+    {"SingleDigitHour", "7:30", "", "", false},
+    {"ThreeCharacters", "7:3", "", "", false},
+    {"HourOnly", "7", "", "", false},
     {"NotDigits", "ab:cd:ef", "ab", "cd", true},
 };
 INSTANTIATE_TEST_SUITE_P(Times, TaskTimeTest, ::testing::ValuesIn(kTimeCases),
@@ -233,14 +234,14 @@ TEST_F(OnlineUpdateFixture, TaskWithOtherTimeIsReportedAndStillFollowsTheSetting
 TEST_F(OnlineUpdateFixture, MadeTaskStartsAtTheSetTime)
 {
     setEnabled(true);
-    setString(kTaskTimeUri, "7:30");
+    setString(kTaskTimeUri, "07:05:00");
     OnLineUpdateCommand command("WC_ONLINEUPDATECOMMAND");
     EXPECT_EQ(eOK, command.checkScheduledTask());
     TaskRecord record;
     ASSERT_TRUE(loadTask(record));
     ASSERT_EQ(1u, record.triggers.size());
     EXPECT_EQ(7, record.triggers[0].wStartHour);
-    EXPECT_EQ(0, record.triggers[0].wStartMinute);
+    EXPECT_EQ(5, record.triggers[0].wStartMinute);
     EXPECT_EQ(std::wstring(kDefaultApplication), record.applicationName);
 }
 

@@ -436,10 +436,10 @@ TEST_F(UpdateModeTest, ShortTaskTimesMakeInvalidTaskParameters)
     EXPECT_EQ(utf8(full.startHour()), "07");
     EXPECT_EQ(utf8(full.startMinute()), "05");
 
-    // An invalid time publishes the empty text; texts shorter than hh:mm hold no minute.
+    // An invalid time publishes the empty text; texts shorter than hh:mm are invalid settings.
     m_command->onTaskTimeEditChanged(QTime());
     EXPECT_EQ(publishedString(kTaskTimeUri), "");
-    for (const char* text : {"7", "07", "7:5", "07:"})
+    for (const char* text : {"7", "07", "7:5", "07:", "7:30"})
     {
         ASSERT_EQ(m_dataManager->setData(ID(kTaskTimeUri), BString(wide(text))), 0);
         EXPECT_FALSE(getScheduledTaskParamsFromDM().isValid()) << text;

@@ -151,10 +151,19 @@ ScheduledTaskParams getScheduledTaskParamsFromDM()
         }
     }
 
-    // "hh:mm:ss": the hour is at 0-1, the minute at 3-4. A shorter text gives what it holds.
+    // "hh:mm:ss": the hour is at 0-1, the minute at 3-4. A shorter text is cut to what it holds and
+    // is no valid setting: "7:30" would otherwise start the task at 7:00.
     const size_t length = taskTime.length();
     const ACE_WString hourText = taskTime.substring(0, std::min<size_t>(2, length));
     const ACE_WString minuteText = length > 3 ? taskTime.substring(3, std::min<size_t>(2, length - 3)) : ACE_WString();
+    if (length < 5)
+    {
+        logError(StringUtilities::wideSprintf(
+                     L"getScheduledTaskParamsFromDM: task time '%s' is shorter than hh:mm (hour '%s', minute '%s') - invalid setting",
+                     taskTime.c_str(), hourText.c_str(), minuteText.c_str())
+                     .c_str());
+        return ScheduledTaskParams::s_defaultParams;
+    }
 
     const ACE_WString applicationPath = readString(*dataManager.get(), kExecutablePathUri, kExecutablePathDefault);
     const ACE_WString parameters = readString(*dataManager.get(), kExecutableParametersUri, kExecutableParametersDefault);
