@@ -15,4 +15,8 @@ public:
     static ACE_WString wideVsprintf(const wchar_t* format, va_list args);
     // A narrow format, formatted to a wide string.
     static ACE_WString narrowVsprintf(const char* format, va_list args);
+
+    // The integer at the start of `text`, as atoi reads it (leading blanks, a sign, then digits),
+    // but taking only the digits 0-9; 0 when there is none, clamped to the range of int.
+    static int toInt(const wchar_t* text);
 };

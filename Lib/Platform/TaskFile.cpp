@@ -1,12 +1,15 @@
 #include "TaskFile.h"
 
 #include "EffectiveUser.h"
+#include "SettingsFile.h"
 #include "TaskSchedulerSettings.h"
+#include "TesselLog_Static.h"
 #include "Win32ErrnoMap.h"
 
 #include <pugixml.hpp>
 
 #include <fcntl.h>
+#include <sys/stat.h>
 #include <unistd.h>
 
 #include <cerrno>
@@ -28,31 +31,19 @@ HRESULT fromErrno(int value)
     return HRESULT_FROM_WIN32(Win32ErrnoMap::win32ErrorFromErrno(value));
 }
 
-// Reads the whole file; S_OK or the HRESULT of the failure.
+// Reads the whole file with the settings files' limits; S_OK or the HRESULT of the failure. A file
+// refused by those limits (too large, not a regular file) reads as a damaged task.
 HRESULT readFile(const std::string& path, std::string& content)
 {
-    const int fd = ::open(path.c_str(), O_RDONLY | O_CLOEXEC);
-    if (fd < 0)
-        return fromErrno(errno);
-    content.clear();
-    char buffer[4096];
-    for (;;)
-    {
-        const ssize_t n = ::read(fd, buffer, sizeof buffer);
-        if (n < 0 && errno == EINTR)
-            continue;
-        if (n < 0)
-        {
-            const int error = errno;
-            ::close(fd);
-            return fromErrno(error);
-        }
-        if (n == 0)
-            break;
-        content.append(buffer, static_cast<size_t>(n));
-    }
-    ::close(fd);
-    return S_OK;
+    std::string error;
+    int errorNumber = 0;
+    if (SettingsFile::read(path, content, error, errorNumber))
+        return S_OK;
+    if (errorNumber != 0)
+        return fromErrno(errorNumber);
+    TesselLog_Static::log_static(TesselLog_Static::eWARNING, 0, "Win32Platform", "libWin32Platform.so", "TaskFile",
+                                 L"TaskFile: '%S' refused: %S", path.c_str(), error.c_str());
+    return SCHED_E_UNKNOWN_OBJECT_VERSION;
 }
 
 bool readNumber(const pugi::xml_node& node, const char* name, unsigned long max, unsigned long& value)
@@ -222,45 +213,18 @@ std::string serialise(const TaskRecord& record)
     return out.str();
 }
 
-// Writes `content` to `path` through a temporary file in the same folder.
+// Writes `content` to `path` atomically, creating the tasks folder when needed.
 HRESULT writeAtomically(const std::string& path, const std::string& content)
 {
-    const std::filesystem::path target(path);
     std::error_code folderError;
-    std::filesystem::create_directories(target.parent_path(), folderError);
-
-    std::string temporary = path + ".XXXXXX";
-    const int fd = ::mkostemp(temporary.data(), O_CLOEXEC);
-    if (fd < 0)
-        return fromErrno(errno);
-    int error = 0;
-    size_t written = 0;
-    while (written < content.size() && error == 0)
-    {
-        const ssize_t n = ::write(fd, content.data() + written, content.size() - written);
-        if (n < 0 && errno != EINTR)
-            error = errno;
-        else if (n > 0)
-            written += static_cast<size_t>(n);
-    }
-    if (error == 0 && ::fsync(fd) != 0)
-        error = errno;
-    if (::close(fd) != 0 && error == 0)
-        error = errno;
-    if (error == 0 && ::rename(temporary.c_str(), path.c_str()) != 0)
-        error = errno;
-    if (error != 0)
-    {
-        ::unlink(temporary.c_str());
-        return fromErrno(error);
-    }
-    const int folder = ::open(target.parent_path().c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC);
-    if (folder >= 0)
-    {
-        ::fsync(folder);
-        ::close(folder);
-    }
-    return S_OK;
+    std::filesystem::create_directories(std::filesystem::path(path).parent_path(), folderError);
+    std::string error;
+    int errorNumber = 0;
+    if (SettingsFile::writeAtomically(path, content, error, errorNumber))
+        return S_OK;
+    if (errorNumber != 0)
+        return fromErrno(errorNumber);
+    return fromErrno(EFBIG);
 }
 }
 
@@ -333,11 +297,14 @@ HRESULT TaskFile::remove(const std::wstring& name)
     const std::string path = pathOf(name);
     std::string content;
     const HRESULT read = readFile(path, content);
-    if (FAILED(read))
+    // A damaged file may go (an oversized one too, but never what is not a regular file); a
+    // readable one only when it is the user's own.
+    struct stat info{};
+    const bool regular = ::lstat(path.c_str(), &info) == 0 && S_ISREG(info.st_mode);
+    if (FAILED(read) && (read != SCHED_E_UNKNOWN_OBJECT_VERSION || !regular))
         return read;
     TaskRecord parsed;
-    // A damaged file may go; a readable one only when it is the user's own.
-    if (SUCCEEDED(parse(content, parsed)) && parsed.owner != EffectiveUser::loginName())
+    if (SUCCEEDED(read) && SUCCEEDED(parse(content, parsed)) && parsed.owner != EffectiveUser::loginName())
         return E_ACCESSDENIED;
     if (::unlink(path.c_str()) != 0)
         return fromErrno(errno);

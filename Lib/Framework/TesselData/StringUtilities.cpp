@@ -3,6 +3,8 @@
 #include "Utf8Codec.h"
 #include "WideString.h"
 
+#include <algorithm>
+#include <climits>
 #include <cstddef>
 #include <cstdint>
 #include <cstdio>
@@ -401,4 +403,25 @@ ACE_WString StringUtilities::wideVsprintf(const wchar_t* format, va_list args)
 ACE_WString StringUtilities::narrowVsprintf(const char* format, va_list args)
 {
     return WideString::fromStd(formatWith(format, args));
+}
+
+int StringUtilities::toInt(const wchar_t* text)
+{
+    if (text == nullptr)
+        return 0;
+    while (*text == L' ' || (*text >= L'\t' && *text <= L'\r'))
+        ++text;
+    const bool negative = *text == L'-';
+    if (*text == L'-' || *text == L'+')
+        ++text;
+    long long value = 0;
+    for (; *text >= L'0' && *text <= L'9'; ++text)
+    {
+        value = value * 10 + (*text - L'0');
+        if (value > static_cast<long long>(INT_MAX) + 1)
+            value = static_cast<long long>(INT_MAX) + 1;
+    }
+    if (negative)
+        value = -value;
+    return static_cast<int>(std::clamp<long long>(value, INT_MIN, INT_MAX));
 }

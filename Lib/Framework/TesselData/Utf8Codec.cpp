@@ -111,3 +111,20 @@ void Utf8Codec::encode(const wchar_t* data, std::size_t size, std::string& out)
     for (std::size_t i = 0; i < size; ++i)
         encodeOne(data[i], out);
 }
+
+std::size_t Utf8Codec::firstInvalid(const char* data, std::size_t size)
+{
+    const char* const end = data + size;
+    const char* p = data;
+    while (p < end)
+    {
+        wchar_t c = 0;
+        const std::size_t used = decodeOne(p, end, c);
+        // U+FFFD itself is valid when it is written out in full.
+        if (c == kReplacement && !(used == 3 && static_cast<unsigned char>(p[0]) == 0xEF &&
+                                   static_cast<unsigned char>(p[1]) == 0xBF && static_cast<unsigned char>(p[2]) == 0xBD))
+            return static_cast<std::size_t>(p - data);
+        p += used;
+    }
+    return size;
+}

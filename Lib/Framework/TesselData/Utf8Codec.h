@@ -14,6 +14,8 @@ public:
     // or 0 at the end of the input.
     static std::size_t decodeOne(const char* p, const char* end, wchar_t& out);
     static void decode(const char* data, std::size_t size, std::wstring& out);
+    // Offset of the first byte that is not valid UTF-8, or `size` when all of it is.
+    static std::size_t firstInvalid(const char* data, std::size_t size);
     // Appends the UTF-8 form of `c`; surrogates and values above U+10FFFF give U+FFFD.
     static void encodeOne(wchar_t c, std::string& out);
     static void encode(const wchar_t* data, std::size_t size, std::string& out);

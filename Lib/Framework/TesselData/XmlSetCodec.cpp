@@ -5,10 +5,13 @@
 #include "BInt.h"
 #include "BSet.h"
 #include "BString.h"
+#include "Utf8Codec.h"
 #include "WideString.h"
 
 #include <pugixml.hpp>
 
+#include <algorithm>
+#include <cctype>
 #include <charconv>
 #include <cstring>
 #include <memory>
@@ -62,6 +65,96 @@ std::string trimmed(const std::string& text)
     while (end > begin && isXmlSpace(text[end - 1]))
         --end;
     return text.substr(begin, end - begin);
+}
+
+// windows-1252's characters for the bytes 0x80 to 0x9F; the five it leaves undefined keep their
+// C1 control code.
+const char16_t kWindows1252High[32] = {
+    0x20AC, 0x0081, 0x201A, 0x0192, 0x201E, 0x2026, 0x2020, 0x2021, 0x02C6, 0x2030, 0x0160,
+    0x2039, 0x0152, 0x008D, 0x017D, 0x008F, 0x0090, 0x2018, 0x2019, 0x201C, 0x201D, 0x2022,
+    0x2013, 0x2014, 0x02DC, 0x2122, 0x0161, 0x203A, 0x0153, 0x009D, 0x017E, 0x0178};
+
+std::string lowerAscii(std::string text)
+{
+    std::transform(text.begin(), text.end(), text.begin(),
+                   [](unsigned char c) { return static_cast<char>(std::tolower(c)); });
+    return text;
+}
+
+// The encoding named by the XML declaration at the start of `bytes`, lower case; empty when none.
+std::string declaredEncoding(const std::string& bytes)
+{
+    if (bytes.compare(0, 5, "<?xml") != 0)
+        return std::string();
+    const std::size_t close = bytes.find("?>");
+    const std::string declaration = bytes.substr(0, close);
+    std::size_t at = declaration.find("encoding");
+    if (at == std::string::npos)
+        return std::string();
+    at = declaration.find_first_of("\"'", at);
+    if (at == std::string::npos)
+        return std::string();
+    const std::size_t end = declaration.find(declaration[at], at + 1);
+    if (end == std::string::npos)
+        return std::string();
+    return lowerAscii(declaration.substr(at + 1, end - at - 1));
+}
+
+// Each byte of a single-byte encoding as UTF-8: ISO-8859-1, or windows-1252 with `windows`.
+std::string singleByteToUtf8(const std::string& bytes, bool windows)
+{
+    std::string out;
+    out.reserve(bytes.size() + bytes.size() / 8);
+    for (const char byte : bytes)
+    {
+        const auto value = static_cast<unsigned char>(byte);
+        const wchar_t c =
+            windows && value >= 0x80 && value < 0xA0 ? static_cast<wchar_t>(kWindows1252High[value - 0x80]) : value;
+        Utf8Codec::encodeOne(c, out);
+    }
+    return out;
+}
+
+// Brings the document to UTF-8 for the parser, honouring a byte-order mark or the declared
+// encoding. Documents in UTF-16 or UTF-32 (recognised by their first bytes) are left to the
+// parser: `utf8` is then false and `out` untouched.
+bool toUtf8(const std::string& bytes, std::string& out, bool& utf8, std::string& error)
+{
+    utf8 = true;
+    const auto byteAt = [&bytes](std::size_t i) { return i < bytes.size() ? static_cast<unsigned char>(bytes[i]) : 0x100; };
+    std::size_t start = 0;
+    if (byteAt(0) == 0xEF && byteAt(1) == 0xBB && byteAt(2) == 0xBF)
+        start = 3;
+    else if ((byteAt(0) == 0xFE && byteAt(1) == 0xFF) || (byteAt(0) == 0xFF && byteAt(1) == 0xFE) ||
+             byteAt(0) == 0x00 || byteAt(1) == 0x00)
+    {
+        utf8 = false;
+        return true;
+    }
+    const std::string encoding = start == 0 ? declaredEncoding(bytes) : std::string("utf-8");
+    if (encoding == "iso-8859-1" || encoding == "iso8859-1" || encoding == "latin1" || encoding == "latin-1")
+    {
+        out = singleByteToUtf8(bytes, false);
+        return true;
+    }
+    if (encoding == "windows-1252" || encoding == "cp1252")
+    {
+        out = singleByteToUtf8(bytes, true);
+        return true;
+    }
+    if (!encoding.empty() && encoding != "utf-8" && encoding != "utf8" && encoding != "us-ascii")
+    {
+        error = "unsupported encoding '" + encoding + "'";
+        return false;
+    }
+    const std::size_t invalid = Utf8Codec::firstInvalid(bytes.data() + start, bytes.size() - start);
+    if (invalid != bytes.size() - start)
+    {
+        error = "invalid UTF-8 at byte offset " + std::to_string(start + invalid);
+        return false;
+    }
+    out.assign(bytes, start, std::string::npos);
+    return true;
 }
 
 template <typename T>
@@ -264,7 +357,13 @@ bool XmlSetCodec::parse(const std::string& bytes, BSet& out, std::string& error)
     // No end-of-line normalisation: a "\r" written raw inside a value must come back as it was.
     const unsigned int flags =
         (pugi::parse_default & ~pugi::parse_eol) | pugi::parse_ws_pcdata | pugi::parse_doctype;
-    const pugi::xml_parse_result result = document.load_buffer(bytes.data(), bytes.size(), flags, pugi::encoding_auto);
+    std::string utf8Bytes;
+    bool utf8 = true;
+    if (!toUtf8(bytes, utf8Bytes, utf8, error))
+        return false;
+    const pugi::xml_parse_result result =
+        utf8 ? document.load_buffer(utf8Bytes.data(), utf8Bytes.size(), flags, pugi::encoding_utf8)
+             : document.load_buffer(bytes.data(), bytes.size(), flags, pugi::encoding_auto);
     if (!result)
     {
         error = std::string("malformed XML: ") + result.description() + " at offset " +

@@ -16,7 +16,9 @@
 #include <ace/Time_Value.h>
 
 #include <QApplication>
+#include <QEventLoop>
 #include <QPushButton>
+#include <QTimer>
 
 #include <pthread.h>
 
@@ -79,10 +81,10 @@ const wchar_t* const kTaskResultMessages[] = {
     L"OnLineUpdateCommand::startConfigurationTestWindow: OnlineUpdateCommand_NS::eUNKNOWN_ERROR",
 };
 
-// The messages below hold no conversion, so each is its own format.
+// Messages may hold runtime text, so they are never used as a format.
 void logError(const wchar_t* message)
 {
-    TesselLog_Static::logError_static(kComponent, kFile, kClass, -1, message);
+    TesselLog_Static::logError_static(kComponent, kFile, kClass, -1, L"%s", message);
 }
 
 void logWarning(const wchar_t* message)
@@ -113,6 +115,27 @@ ACE_WString readString(PDataManager& dataManager, const wchar_t* uri, const wcha
     if (value.is_empty())
         value = defaultValue;
     return value;
+}
+
+// A two-digit number from `first` to at most `maximum`.
+bool isTwoDigits(const ACE_WString& text, size_t first, int maximum)
+{
+    const wchar_t tens = text[first];
+    const wchar_t units = text[first + 1];
+    if (tens < L'0' || tens > L'9' || units < L'0' || units > L'9')
+        return false;
+    return (tens - L'0') * 10 + (units - L'0') <= maximum;
+}
+
+// "hh:mm" or "hh:mm:ss", hours 00-23, minutes and seconds 00-59.
+bool isTaskTime(const ACE_WString& text)
+{
+    const size_t length = text.length();
+    if (length != 5 && length != 8)
+        return false;
+    if (!isTwoDigits(text, 0, 23) || text[2] != L':' || !isTwoDigits(text, 3, 59))
+        return false;
+    return length == 5 || (text[5] == L':' && isTwoDigits(text, 6, 59));
 }
 
 // Names the calling thread for debuggers; the system keeps 15 characters.
@@ -164,6 +187,14 @@ ScheduledTaskParams getScheduledTaskParamsFromDM()
                      .c_str());
         return ScheduledTaskParams::s_defaultParams;
     }
+    if (!isTaskTime(taskTime))
+    {
+        logError(StringUtilities::wideSprintf(
+                     L"getScheduledTaskParamsFromDM: task time '%s' is not hh:mm or hh:mm:ss - invalid setting",
+                     taskTime.c_str())
+                     .c_str());
+        return ScheduledTaskParams::s_defaultParams;
+    }
 
     const ACE_WString applicationPath = readString(*dataManager.get(), kExecutablePathUri, kExecutablePathDefault);
     const ACE_WString parameters = readString(*dataManager.get(), kExecutableParametersUri, kExecutableParametersDefault);
@@ -182,6 +213,8 @@ OnLineUpdateCommand::OnLineUpdateCommand(const QString& commandId)
         return;
     }
     QObject::connect(m_waitDialog.cancelButton(), SIGNAL(clicked()), this, SLOT(onCancelClicked()));
+    // Escape and the window's close button reject the dialog: that cancels the test too.
+    QObject::connect(&m_waitDialog, SIGNAL(rejected()), this, SLOT(onCancelClicked()));
 }
 
 OnLineUpdateCommand::~OnLineUpdateCommand() = default;
@@ -320,9 +353,9 @@ bool OnLineUpdateCommand::startConfigurationTestWindow()
     }
     m_testFuture = future;
 
-    // The worker takes over its hold; nobody joins it.
-    if (ACE_Thread_Manager::instance()->spawn(&OnLineUpdateCommand::threadEntry_static, workerHold.get(), 0, nullptr,
-                                              nullptr, 0) == -1)
+    // The worker takes over its hold; it is detached, so it leaves nothing behind when it ends.
+    if (ACE_Thread_Manager::instance()->spawn(&OnLineUpdateCommand::threadEntry_static, workerHold.get(),
+                                              THR_NEW_LWP | THR_DETACHED, nullptr, nullptr, 0) == -1)
     {
         // Without a worker nobody would answer: the test ends at once with no agent answer.
         logError(L"OnLineUpdateCommand::startConfigurationTestWindow: unable to start the test thread - "
@@ -334,11 +367,21 @@ bool OnLineUpdateCommand::startConfigurationTestWindow()
         workerHold.release();
     }
 
-    while (!future->ready())
+    // Polls the future from an event loop of its own, which also ends when the application quits;
+    // the test then counts as canceled.
     {
-        QApplication::processEvents();
-        ACE_OS::sleep(ACE_Time_Value(0, kPollMicroseconds));
+        QEventLoop loop;
+        QTimer poll;
+        QObject::connect(&poll, &QTimer::timeout, &loop, [&loop, &future]() {
+            if (future->ready())
+                loop.quit();
+        });
+        poll.start(static_cast<int>(kPollMicroseconds / 1000));
+        if (!future->ready())
+            loop.exec();
     }
+    if (!future->ready())
+        onCancelClicked();
 
     TCheckResults results;
     results.canceled = false;
@@ -427,14 +470,22 @@ unsigned long OnLineUpdateCommand::threadMethod_static(void* parameter)
         else
         {
             int answer = agent->checkConfigurationPreparer();
-            if (answer > kFirstPreparerAnswer || answer < kLastPreparerAnswer)
-                answer = IProcStartUpdateAgent::eNOK_DISTRIBUTION_FOLDER_UNKNOWN_ERROR;
-            results.preparerResult = static_cast<IProcStartUpdateAgent::_enum_CheckConfigurationPreparer>(answer);
-            const wchar_t* message = kPreparerMessages[kFirstPreparerAnswer - answer];
-            if (answer == IProcStartUpdateAgent::eOK)
-                logInformation(message);
+            if (answer == IProcStartUpdateAgent::eNOK_NO_AGENT)
+            {
+                // The starter lost its agent during the test: the user sees that no agent answered.
+                logError(L"OnLineUpdateCommand::threadMethod_static: IProcStartUpdateAgent::eNOK_NO_AGENT");
+            }
             else
-                logError(message);
+            {
+                if (answer > kFirstPreparerAnswer || answer < kLastPreparerAnswer)
+                    answer = IProcStartUpdateAgent::eNOK_DISTRIBUTION_FOLDER_UNKNOWN_ERROR;
+                const wchar_t* message = kPreparerMessages[kFirstPreparerAnswer - answer];
+                if (answer == IProcStartUpdateAgent::eOK)
+                    logInformation(message);
+                else
+                    logError(message);
+            }
+            results.preparerResult = static_cast<IProcStartUpdateAgent::_enum_CheckConfigurationPreparer>(answer);
         }
         results.testCompleted = true;
         agent.giveBack();

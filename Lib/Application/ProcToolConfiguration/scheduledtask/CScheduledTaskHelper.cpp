@@ -578,7 +578,8 @@ _enum_CheckConfigurationScheduledTaskResult CScheduledTaskHelper::checkScheduled
     const ACE_WString application = takeTaskString(text);
     const ACE_WString foundPath = getAbsolutePathLowercase(application.c_str());
     const ACE_WString expectedPath = getAbsolutePathLowercase(m_rParams.applicationPath().c_str());
-    if (foundPath != expectedPath)
+    // A path that cannot be made absolute ("") matches nothing, not even another such path.
+    if (foundPath.is_empty() || expectedPath.is_empty() || foundPath != expectedPath)
     {
         logLine(kFailure,
                 L"CScheduledTaskHelper::checkScheduledTask: unexpeted executable '%s' (abs path '%s') - should be '%s' "

@@ -3,7 +3,6 @@
 #include "StringUtilities.h"
 #include "TesselLog_Static.h"
 
-#include <ace/OS_NS_stdlib.h>
 
 namespace
 {
@@ -293,7 +292,7 @@ bool UsersUpdater::isActivated()
     if (!enter(m_loaded, L"[bool UsersUpdater::isActivated()]"))
         return false;
     const ACE_WString value = readString(&m_content, kActivation);
-    return ACE_OS::atoi(value.c_str()) != 0;
+    return StringUtilities::toInt(value.c_str()) != 0;
 }
 
 bool UsersUpdater::activate(bool on)

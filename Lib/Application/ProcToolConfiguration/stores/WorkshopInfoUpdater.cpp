@@ -10,7 +10,6 @@
 #include "TesselLog_Static.h"
 #include "Win32File.h"
 
-#include <ace/OS_NS_stdlib.h>
 
 namespace
 {
@@ -300,7 +299,7 @@ const ACE_WString WorkshopInfoUpdater::getDefaultBrand()
     m_content.getString(kDefaultBrand, stored);
     if (stored.length() == 0 || !lookup.brands().contains(stored))
         return ACE_WString();
-    const int number = ACE_OS::atoi(stored.c_str());
+    const int number = StringUtilities::toInt(stored.c_str());
     if (number == 0)
         return ACE_WString();
     return lookup.text(number, ACE_WString());
@@ -323,7 +322,7 @@ bool WorkshopInfoUpdater::setDefaultBrand(const ACE_WString& brandName)
         keys.getAt(i, key);
         ACE_WString defaultName;
         lookup.brands().getString(key, defaultName);
-        if (lookup.text(ACE_OS::atoi(key.c_str()), defaultName) == brandName)
+        if (lookup.text(StringUtilities::toInt(key.c_str()), defaultName) == brandName)
         {
             m_content.setString(kDefaultBrand, key);
             return true;

@@ -18,7 +18,6 @@
 #include "WorkshopInfoUpdater.h"
 
 #include <ace/Guard_T.h>
-#include <ace/OS_NS_stdlib.h>
 
 #include <QEvent>
 #include <QFileDialog>
@@ -276,20 +275,23 @@ void ToolConfigurationCommand::createDMData(bool reset)
 {
     trace(L"[ToolConfigurationCommand::createDMData] : Method started");
 
+    // Every store is made afresh from its file, whatever happens to the others: a rebuild (Cancel,
+    // a changed file) never keeps an edit that was not saved.
     delete m_pWorkshopInfoUpdater;
     m_pWorkshopInfoUpdater = nullptr;
     m_pWorkshopInfoUpdater = new WorkshopInfoUpdater(readPath(kWorkshopFileDefault, kWorkshopFileUri));
     // A missing workshop file leaves the store loaded and empty (its first save creates the
     // file); only a file that cannot be read stops the publication.
-    if (!m_pWorkshopInfoUpdater->load() && !m_pWorkshopInfoUpdater->isLoaded())
-        return;
+    const bool workshopLoaded = m_pWorkshopInfoUpdater->load() || m_pWorkshopInfoUpdater->isLoaded();
 
     delete m_pUsersUpdater;
     m_pUsersUpdater = nullptr;
     m_pUsersUpdater = new UsersUpdater(readPath(kUsersFileDefault, kUsersFileUri));
-    if (!m_pUsersUpdater->load())
-        return;
+    const bool usersLoaded = m_pUsersUpdater->load();
+    m_app2AppValues = BSet(10);
+    m_app2AppIP.clear();
 
+    bool updateLoaded = false;
     {
         ACE_Guard<ACE_Thread_Mutex> guard(m_storesMutex);
         delete m_pUpdateUpdater;
@@ -312,9 +314,10 @@ void ToolConfigurationCommand::createDMData(bool reset)
         }
 
         m_pUpdateUpdater = new UpdateUpdater(activePath);
-        if (!m_pUpdateUpdater->load())
-            return;
+        updateLoaded = m_pUpdateUpdater->load();
     }
+    if (!workshopLoaded || !usersLoaded || !updateLoaded)
+        return;
 
     createDataForControl(L"ProjectNumberEdit");
     createDataForControl(L"CompanyNameEdit");
@@ -566,7 +569,7 @@ void ToolConfigurationCommand::createDataForCombo(const ACE_WString& name)
     for (size_t i = 0; i < paddedKeys.size(); ++i)
     {
         const ACE_WString paddedKey(paddedKeys[i].c_str(), paddedKeys[i].size());
-        const int number = ACE_OS::atoi(paddedKey.c_str());
+        const int number = StringUtilities::toInt(paddedKey.c_str());
         ACE_WString defaultLabel;
         brands.getString(paddedKey, defaultLabel);
         const ACE_WString label = bText->getText(number, defaultLabel);
@@ -937,17 +940,19 @@ void ToolConfigurationCommand::saveUsersAndApp2App()
         m_pUsersUpdater->addUser(name, address, phone);
     }
 
-    ACE_WString port;
-    ACE_WString ip;
-    ACE_WString dealerId;
+    // A value the dialog never showed keeps what the file holds.
+    ACE_WString port = m_pUsersUpdater->getApp2AppPort();
+    ACE_WString ip = m_pUsersUpdater->getApp2AppIP();
+    ACE_WString dealerId = m_pUsersUpdater->getApp2AppDealerID();
     m_app2AppValues.getString(L"App2AppPort", port);
-    m_app2AppValues.getString(L"App2AppIP", ip);
     m_app2AppValues.getString(L"App2AppDealerID", dealerId);
-
-    const ACE_WString typedIp = ip;
-    validateIP(ip);
-    if (ip != typedIp)
-        updateDataForControl(L"App2AppIP", ip);
+    if (m_app2AppValues.getString(L"App2AppIP", ip) == 0)
+    {
+        const ACE_WString typedIp = ip;
+        validateIP(ip);
+        if (ip != typedIp)
+            updateDataForControl(L"App2AppIP", ip);
+    }
 
     m_pUsersUpdater->setApp2AppParams(port, ip, dealerId);
     if (!m_pUsersUpdater->save())
@@ -971,6 +976,10 @@ void ToolConfigurationCommand::saveOnlineUpdateAndTask()
             // A configuration test left the active path on its temporary copy; the saved file
             // is what a later rebuild must read.
             m_dataManager->setString(controlUri(ACE_WString(kActivePreparateur)), path);
+
+        // Without its settings the online-update switch is unknown: the flag and the task stay.
+        if (!m_pUpdateUpdater->isLoaded())
+            return;
 
         onLineUpdate = std::make_unique<OnLineUpdateCommand>(QString("WC_TOOLCONFIGURATION"));
         const bool enabled = m_pUpdateUpdater->getCheckInternet();

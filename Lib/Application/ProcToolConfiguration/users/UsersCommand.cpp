@@ -12,7 +12,6 @@
 #include "TesselLog_Static.h"
 #include "UsersUpdater.h"
 
-#include <ace/OS_NS_stdlib.h>
 
 #include <QLineEdit>
 
@@ -128,14 +127,18 @@ void UsersCommand::createDMUsersData()
     BSet users(10);
     if (store.load())
     {
-        const unsigned int count = store.getUserCount();
-        for (unsigned int i = 0; i < count; ++i)
+        // Every used slot, in slot order, also past a free one; the keys have no gaps.
+        int published = 0;
+        for (unsigned int slot = 0; slot < store.getMaxUserCount(); ++slot)
         {
+            const ACE_WString name = store.getUserName(slot);
+            if (name.is_empty() || name == ACE_WString(L"0"))
+                continue;
             BSet entry(10);
-            entry.set(L"name", BString(store.getUserName(i)));
-            entry.set(L"phone", BString(store.getUserPhone(i)));
-            entry.set(L"address", BString(store.getUserAddress(i)));
-            users.set(userKey(static_cast<int>(i)), entry);
+            entry.set(L"name", BString(name));
+            entry.set(L"phone", BString(store.getUserPhone(slot)));
+            entry.set(L"address", BString(store.getUserAddress(slot)));
+            users.set(userKey(published++), entry);
         }
     }
     m_dataManager->createData(ID(kUserSetUri), users);
@@ -314,7 +317,7 @@ void UsersCommand::onDeleteClicked(const QListViewItem* listItem)
 
     ACE_WString key;
     findKeyForUser(name, key);
-    const int index = ACE_OS::atoi(key.substr(kUserKeyPrefixLength).c_str());
+    const int index = StringUtilities::toInt(key.substr(kUserKeyPrefixLength).c_str());
     if (index >= count)
     {
         // Nobody of that name: nothing to remove.

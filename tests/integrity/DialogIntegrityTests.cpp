@@ -1,0 +1,308 @@
+#include "BBool.h"
+#include "CScheduledTaskHelper.h"
+#include "Dialog_ConfigurationTestBase.h"
+#include "DialogDrivers.h"
+#include "DialogFixture.h"
+#include "EffectiveUser.h"
+#include "LogCapture.h"
+#include "OnLineUpdateCommand.h"
+#include "ScheduledTaskParams.h"
+#include "TaskFile.h"
+#include "ToolConfigurationCommand.h"
+#include "UsersCommand.h"
+
+#include <gtest/gtest.h>
+
+#include <QKeyEvent>
+
+#include <sys/stat.h>
+
+#include <filesystem>
+#include <memory>
+#include <string>
+
+// Reaches the configuration test's wait dialog.
+class OnLineUpdateCommandTestAccess
+{
+public:
+    static Dialog_ConfigurationTestBase& waitDialog(OnLineUpdateCommand& c) { return c.m_waitDialog; }
+};
+
+namespace
+{
+std::string taskPath()
+{
+    return TaskFile::pathOf(std::wstring(L"VEXAPreparerTask_") + EffectiveUser::loginName());
+}
+
+// Users file with slotSet 1, 2 and 4 used and slot 3 free.
+void writeUsersWithGap(const std::string& path)
+{
+    BSet slotSet(10);
+    const User users[] = {kAnna, kBruno, {"0", "0", "0"}, kClara};
+    for (int i = 0; i < 4; ++i)
+    {
+        BSet slot(10);
+        slot.setString(L"name"_w, wide(users[i].name));
+        slot.setString(L"address"_w, wide(users[i].address));
+        slot.setString(L"telephone"_w, wide(users[i].phone));
+        slotSet.setSet(wide("user" + std::to_string(i + 1)), slot);
+    }
+    BSet content(10);
+    content.setString(L"activation"_w, L"1"_w);
+    content.setSet(L"users"_w, slotSet);
+    SettingsFiles::save(content, path);
+}
+}
+
+class DialogIntegrityTest : public DialogFixture
+{
+protected:
+    void TearDown() override
+    {
+        m_command.reset();
+        DialogFixture::TearDown();
+    }
+
+    ToolConfigurationCommand& open()
+    {
+        m_command = std::make_unique<ToolConfigurationCommand>(QStringLiteral("WC_TOOLCONFIGURATION"));
+        return *m_command;
+    }
+
+    void republishUsers()
+    {
+        UsersCommand users(QStringLiteral("WC_USERSCOMMAND"));
+        users.createDMUsersData();
+    }
+
+    bool enabledFlag()
+    {
+        bool value = false;
+        EXPECT_EQ(m_dataManager->getBool(ID(Uri::kEnableOnlineUpdate), value), 0);
+        return value;
+    }
+
+    std::unique_ptr<ToolConfigurationCommand> m_command;
+};
+
+// Without a readable online-update file, OK keeps the App2App values the dialog never showed,
+// and leaves the online-update switch and the task as they were.
+TEST_F(DialogIntegrityTest, OkWithoutOnlineUpdateFileKeepsApp2AppSwitchAndTask)
+{
+    for (const bool missing : {true, false})
+    {
+        SCOPED_TRACE(missing ? "missing" : "malformed");
+        if (missing)
+            std::filesystem::remove(m_updatePath);
+        else
+            TempDir::write(m_updatePath, "<BSet><Bool key=\"OnlineUpdateActivated\">true");
+        ASSERT_EQ(m_dataManager->createData(ID(Uri::kEnableOnlineUpdate), BBool(false)), 0);
+        open();
+        republishUsers();
+        m_command->onOKButtonClicked();
+
+        const BSet users = SettingsFiles::read(m_usersPath);
+        BSet app2App(10);
+        ASSERT_EQ(users.getSet(L"App2App"_w, app2App), 0);
+        EXPECT_EQ(SettingsFiles::stringAt(app2App, "Port"), "8080");
+        EXPECT_EQ(SettingsFiles::stringAt(app2App, "IP"), "10.0.0.7");
+        BSet attributes(10);
+        app2App.getSet(L"RequestAttributes"_w, attributes);
+        EXPECT_EQ(SettingsFiles::stringAt(attributes, "dealerId"), "D77");
+        EXPECT_EQ(SettingsFiles::usersIn(m_usersPath), (std::vector<User>{kAnna, kBruno, kClara}));
+        EXPECT_FALSE(enabledFlag());
+        EXPECT_FALSE(std::filesystem::exists(taskPath()));
+        EXPECT_EQ(std::filesystem::exists(m_updatePath), !missing);
+    }
+}
+
+// Cancel throws every pending edit away, also when a damaged file stops the rebuild early.
+TEST_F(DialogIntegrityTest, CancelWithMalformedWorkshopDiscardsEveryEdit)
+{
+    open();
+    republishUsers();
+    TempDir::write(m_workshopPath, "<BSet><String key=\"nom\">");
+    m_command->onPortChanged(QStringLiteral("9999"));
+    m_command->onDealerIDChanged(QStringLiteral("D00"));
+    m_command->onCheckInternetChecked(true);
+    m_command->onOtherRadioButtonClicked();
+    m_command->onDistributionFolderPathChanged(QStringLiteral("/elsewhere"));
+    BSet noUsers(10);
+    ASSERT_EQ(m_dataManager->createData(ID(Uri::kUserSet), noUsers), 0);
+
+    m_command->onCancelButtonClicked();
+    m_command->onOKButtonClicked();
+
+    EXPECT_EQ(SettingsFiles::usersIn(m_usersPath), (std::vector<User>{kAnna, kBruno, kClara}));
+    const BSet users = SettingsFiles::read(m_usersPath);
+    BSet app2App(10);
+    users.getSet(L"App2App"_w, app2App);
+    EXPECT_EQ(SettingsFiles::stringAt(app2App, "Port"), "8080");
+    const BSet update = SettingsFiles::read(m_updatePath);
+    EXPECT_EQ(SettingsFiles::stringAt(update, "DeploymentMode"), "LOCAL");
+    EXPECT_EQ(SettingsFiles::stringAt(update, "DistributionFolderPath"), "/srv/dist");
+    bool enabled = true;
+    update.getBool(L"OnlineUpdateActivated"_w, enabled);
+    EXPECT_FALSE(enabled);
+    EXPECT_EQ(TempDir::read(m_workshopPath), "<BSet><String key=\"nom\">");
+}
+
+// Every used slot is listed in slot order, also past a free one, and OK writes them all
+// without gaps.
+TEST_F(DialogIntegrityTest, UsersAfterAFreeSlotAreListedAndKept)
+{
+    writeUsersWithGap(m_usersPath);
+    open();
+    republishUsers();
+    EXPECT_EQ(publishedUsers(*m_dataManager), (std::vector<User>{kAnna, kBruno, kClara}));
+    m_command->onOKButtonClicked();
+    EXPECT_EQ(SettingsFiles::usersIn(m_usersPath), (std::vector<User>{kAnna, kBruno, kClara}));
+}
+
+struct TaskTimeCase
+{
+    const char* name;
+    const char* text;
+    const char* hour; // null: invalid
+    const char* minute;
+};
+
+void PrintTo(const TaskTimeCase& c, std::ostream* os)
+{
+    *os << c.name;
+}
+
+class TaskTimeTest : public ComponentFixture, public ::testing::WithParamInterface<TaskTimeCase>
+{
+};
+
+// Only hh:mm or hh:mm:ss within the day make a task; anything else gives the invalid defaults
+// and an error line that shows the text as it is, never as a format.
+TEST_P(TaskTimeTest, OnlyAWellFormedTimeMakesATask)
+{
+    const TaskTimeCase& c = GetParam();
+    setConfig(Uri::kTaskTime, c.text);
+    LogCapture log;
+    const ScheduledTaskParams params = getScheduledTaskParamsFromDM();
+    if (c.hour == nullptr)
+    {
+        EXPECT_FALSE(params.isValid());
+        EXPECT_TRUE(log.containsSubstring("task time '" + std::string(c.text) + "'"));
+    }
+    else
+    {
+        EXPECT_TRUE(params.isValid());
+        EXPECT_EQ(utf8(params.startHour()), c.hour);
+        EXPECT_EQ(utf8(params.startMinute()), c.minute);
+    }
+}
+
+INSTANTIATE_TEST_SUITE_P(Times, TaskTimeTest,
+                         ::testing::Values(TaskTimeCase{"HourMinute", "07:30", "07", "30"},
+                                           TaskTimeCase{"WithSeconds", "23:59:59", "23", "59"},
+                                           TaskTimeCase{"Midnight", "00:00:00", "00", "00"},
+                                           TaskTimeCase{"FormatInShortText", "%s%s", nullptr, nullptr},
+                                           TaskTimeCase{"FormatInLongText", "%n%n%s%s%S", nullptr, nullptr},
+                                           TaskTimeCase{"OneDigitHour", "7:30:00", nullptr, nullptr},
+                                           TaskTimeCase{"HourOutOfDay", "24:00", nullptr, nullptr},
+                                           TaskTimeCase{"MinuteOutOfHour", "07:60", nullptr, nullptr},
+                                           TaskTimeCase{"SecondsOutOfMinute", "07:30:60", nullptr, nullptr},
+                                           TaskTimeCase{"ShortSeconds", "07:30:0", nullptr, nullptr},
+                                           TaskTimeCase{"OtherSeparator", "07-30", nullptr, nullptr},
+                                           TaskTimeCase{"Letters", "ab:cd", nullptr, nullptr},
+                                           TaskTimeCase{"Short", "7:30", nullptr, nullptr}),
+                         [](const auto& info) { return std::string(info.param.name); });
+
+// Runtime text with conversions reaches the log as it is, in every field that is logged.
+TEST_F(DialogIntegrityTest, RuntimeTextIsNeverAFormat)
+{
+    const std::string hostile = "%s%n%S%d";
+    setConfig(Uri::kWorkshopFile, m_dir.file(hostile + "/InformationsGarage.xml"));
+    setConfig(Uri::kUpdateFile, m_dir.file(hostile + ".xml"));
+    setConfig(Uri::kTaskName, "Task" + hostile);
+    setConfig(Uri::kTaskTime, hostile);
+    LogCapture log;
+    open();
+    EXPECT_TRUE(log.containsSubstring(hostile + "/InformationsGarage.xml"));
+    EXPECT_TRUE(log.containsSubstring(hostile + ".xml"));
+    OnLineUpdateCommand command(QStringLiteral("WC_ONLINEUPDATECOMMAND"));
+    EXPECT_FALSE(command.CreateScheduledTask());
+    EXPECT_TRUE(log.containsSubstring("task time '" + hostile + "'"));
+}
+
+class ConfigurationTestIntegrity : public DialogIntegrityTest
+{
+protected:
+    // Runs a configuration test whose agent never answers on its own; `close` acts on the wait
+    // dialog once it is shown. True when a result dialog was shown.
+    bool runClosingWaitDialog(const std::function<void(Dialog_ConfigurationTestBase&)>& close)
+    {
+        // The agent answers only once the gate file exists, which the test makes after the wait.
+        const std::string gate = m_dir.file("gate");
+        const std::string script = m_dir.file("agent.sh");
+        TempDir::write(script, "#!/bin/sh\nwhile [ ! -e '" + gate + "' ]; do sleep 0.01; done\nexit 0\n");
+        EXPECT_EQ(::chmod(script.c_str(), 0755), 0);
+        setConfig(Uri::kAgentExecutable, script);
+        m_agent->clearTestAnswer();
+        struct GateOpener
+        {
+            std::string path;
+            ~GateOpener() { TempDir::write(path, "open"); }
+        } opener{gate};
+        ResultDialogAccepter results;
+        OnLineUpdateCommand command(QStringLiteral("WC_ONLINEUPDATECOMMAND"));
+        Dialog_ConfigurationTestBase& wait = OnLineUpdateCommandTestAccess::waitDialog(command);
+        QTimer::singleShot(0, &wait, [&wait, &close]() { close(wait); });
+        command.init();
+        EXPECT_FALSE(wait.isVisible());
+        return !results.results.empty();
+    }
+};
+
+// Escape and the window's close button cancel the test as its Cancel button does.
+TEST_F(ConfigurationTestIntegrity, ClosingTheWaitDialogAnyWayCancelsTheTest)
+{
+    const std::pair<const char*, std::function<void(Dialog_ConfigurationTestBase&)>> ways[] = {
+        {"cancel button", [](Dialog_ConfigurationTestBase& d) { d.cancelButton()->click(); }},
+        {"escape", [](Dialog_ConfigurationTestBase& d) {
+             QKeyEvent escape(QEvent::KeyPress, Qt::Key_Escape, Qt::NoModifier);
+             QApplication::sendEvent(&d, &escape);
+         }},
+        {"close button", [](Dialog_ConfigurationTestBase& d) { d.close(); }}};
+    for (const auto& way : ways)
+    {
+        SCOPED_TRACE(way.first);
+        LogCapture log;
+        EXPECT_FALSE(runClosingWaitDialog(way.second));
+        EXPECT_TRUE(log.containsSubstring("test was canceled"));
+    }
+}
+
+// A starter that loses its agent during the test shows the no-agent result.
+TEST_F(ConfigurationTestIntegrity, NoAgentAnswerShowsNoAgent)
+{
+    m_agent->setTestAnswer(-14, 0);
+    ResultDialogAccepter results;
+    {
+        OnLineUpdateCommand command(QStringLiteral("WC_ONLINEUPDATECOMMAND"));
+        command.init();
+    }
+    ASSERT_EQ(results.results.size(), 1u);
+    EXPECT_EQ(results.results[0].preparerText, Dialog_OnLineUpdateConfigurationTestResult::defaultPreparerText(-14));
+    EXPECT_NE(results.results[0].preparerText, Dialog_OnLineUpdateConfigurationTestResult::defaultPreparerText(-12));
+}
+
+// A task whose executable path cannot be made absolute never matches, not even itself.
+TEST_F(DialogIntegrityTest, PathsThatCannotBeMadeAbsoluteNeverMatch)
+{
+    const std::wstring tooLong = L"/opt/" + std::wstring(300, L'a') + L"/agent";
+    ScheduledTaskParams params(L"LongPathTask", tooLong.c_str(), L"preparer", L"07", L"30");
+    CScheduledTaskHelper helper(params);
+    ASSERT_TRUE(helper.createScheduledTask(false));
+    const std::wstring otherLong = L"/srv/" + std::wstring(300, L'b') + L"/other";
+    ScheduledTaskParams other(L"LongPathTask", otherLong.c_str(), L"preparer", L"07", L"30");
+    CScheduledTaskHelper otherHelper(other);
+    EXPECT_EQ(otherHelper.checkScheduledTask(), OnlineUpdateCommand_NS::eWRONG_SETTINGS);
+    EXPECT_EQ(helper.checkScheduledTask(), OnlineUpdateCommand_NS::eWRONG_SETTINGS);
+}
