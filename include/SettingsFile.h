@@ -10,8 +10,9 @@
 class TESSEL_EXPORT SettingsFile
 {
 public:
-    // Largest file read or written. A file of this size loads in well under 64 MB.
-    static constexpr std::size_t kMaxSize = 1024 * 1024;
+    // Largest file read or written. The costliest file of this size (only empty sets) loads in
+    // about 30 MB.
+    static constexpr std::size_t kMaxSize = 512 * 1024;
 
     // The path with both separators taken as folder separators, as the Windows-call layer does.
     static std::string nativePath(const std::string& path);
