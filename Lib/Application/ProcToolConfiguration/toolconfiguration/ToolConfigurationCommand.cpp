@@ -1,5 +1,6 @@
 #include "ToolConfigurationCommand.h"
 
+#include "AddressNormalisation.h"
 #include "BBool.h"
 #include "BInt.h"
 #include "BOStream.h"
@@ -630,17 +631,7 @@ void ToolConfigurationCommand::setRadioButtonState(ACE_WString name, bool state)
 
 void ToolConfigurationCommand::validateIP(ACE_WString& ip)
 {
-    const QStringList parts = toQString(ip).split(QLatin1Char('.'), Qt::KeepEmptyParts);
-    QString result;
-    for (qsizetype i = 0; i < parts.size(); ++i)
-    {
-        bool ok = false;
-        const int value = parts[i].toInt(&ok, 10);
-        result += ok ? QString::number(value) : QStringLiteral("0");
-        if (i + 1 < parts.size())
-            result += QLatin1Char('.');
-    }
-    ip = toWide(result);
+    normaliseDottedAddress(ip);
 }
 
 // ---------------------------------------------------------------------------------------------
