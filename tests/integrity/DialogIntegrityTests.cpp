@@ -260,7 +260,8 @@ protected:
     }
 };
 
-// Escape and the window's close button cancel the test as its Cancel button does.
+// Escape, the window's close button and the application's exit cancel the test as its Cancel
+// button does; the test then returns at once.
 TEST_F(ConfigurationTestIntegrity, ClosingTheWaitDialogAnyWayCancelsTheTest)
 {
     const std::pair<const char*, std::function<void(Dialog_ConfigurationTestBase&)>> ways[] = {
@@ -269,7 +270,8 @@ TEST_F(ConfigurationTestIntegrity, ClosingTheWaitDialogAnyWayCancelsTheTest)
              QKeyEvent escape(QEvent::KeyPress, Qt::Key_Escape, Qt::NoModifier);
              QApplication::sendEvent(&d, &escape);
          }},
-        {"close button", [](Dialog_ConfigurationTestBase& d) { d.close(); }}};
+        {"close button", [](Dialog_ConfigurationTestBase& d) { d.close(); }},
+        {"application quits", [](Dialog_ConfigurationTestBase&) { QCoreApplication::exit(0); }}};
     for (const auto& way : ways)
     {
         SCOPED_TRACE(way.first);
@@ -277,6 +279,9 @@ TEST_F(ConfigurationTestIntegrity, ClosingTheWaitDialogAnyWayCancelsTheTest)
         EXPECT_FALSE(runClosingWaitDialog(way.second));
         EXPECT_TRUE(log.containsSubstring("test was canceled"));
     }
+    // The application's exit stays requested until its own loop has run once.
+    QMetaObject::invokeMethod(qApp, &QCoreApplication::quit, Qt::QueuedConnection);
+    QApplication::exec();
 }
 
 // A starter that loses its agent during the test shows the no-agent result.
