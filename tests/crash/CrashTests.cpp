@@ -1,3 +1,4 @@
+#include "BSet.h"
 #include "SettingsFile.h"
 #include "SettingsFiles.h"
 #include "TaskFile.h"
@@ -5,9 +6,6 @@
 #include "TaskSchedulerSettings.h"
 #include "TempDir.h"
 #include "TestText.h"
-#include "UpdateUpdater.h"
-#include "UsersUpdater.h"
-#include "WorkshopInfoUpdater.h"
 
 #include <gtest/gtest.h>
 
@@ -81,80 +79,39 @@ std::string parentValue(int round)
     return "r" + std::to_string(round) + "parent";
 }
 
-// The workshop, users and online-update files through their stores, and a task file, in one folder.
+// Three settings files and a task file in one folder, each holding one text value.
 class Files
 {
 public:
-    explicit Files(const std::string& folder) : m_folder(folder)
-    {
-        TaskSchedulerSettings::setTasksFolder(folder);
-        SettingsFiles::writeUsers(path(1), {});
-        SettingsFiles::writeUpdate(path(2));
-    }
+    explicit Files(const std::string& folder) : m_folder(folder) { TaskSchedulerSettings::setTasksFolder(folder); }
     ~Files() { TaskSchedulerSettings::setTasksFolder(std::string()); }
 
     std::string path(int file) const { return m_folder + "/" + kNames[file]; }
 
     bool save(int file, const std::string& value) const
     {
-        const ACE_WString text = wide(value);
-        switch (file)
-        {
-        case 0:
-        {
-            WorkshopInfoUpdater store(wide(path(file)));
-            store.load();
-            return store.setName(text) && store.save();
-        }
-        case 1:
-        {
-            UsersUpdater store(wide(path(file)));
-            return store.load() && store.setApp2AppParams(L"8080"_w, L"10.0.0.7"_w, text) && store.save();
-        }
-        case 2:
-        {
-            UpdateUpdater store(wide(path(file)));
-            return store.load() && store.setDistributionFolderPath(text) && store.save(wide(path(file)));
-        }
-        default:
+        if (file == kFiles - 1)
         {
             TaskRecord record;
-            record.applicationName = WideString::toStd(text);
+            record.applicationName = WideString::toStd(wide(value));
             return TaskFile::save(kTask, record) == S_OK;
         }
-        }
+        BSet set(10);
+        set.setString(L"value"_w, wide(value));
+        return set.save(wide(path(file)), false);
     }
 
     // The value the file holds, or "<not loaded>".
     std::string read(int file) const
     {
-        ACE_WString value;
-        bool loaded = false;
-        if (file == 0)
-        {
-            WorkshopInfoUpdater store(wide(path(file)));
-            loaded = store.load();
-            value = store.getName();
-        }
-        else if (file == 1)
-        {
-            UsersUpdater store(wide(path(file)));
-            loaded = store.load();
-            value = store.getApp2AppDealerID();
-        }
-        else if (file == 2)
-        {
-            UpdateUpdater store(wide(path(file)));
-            loaded = store.load();
-            value = store.getDistributionFolderPath();
-        }
-        else
+        if (file == kFiles - 1)
         {
             TaskRecord record;
-            loaded = TaskFile::load(kTask, record) == S_OK;
-            value = WideString::fromStd(record.applicationName);
+            return TaskFile::load(kTask, record) == S_OK ? utf8(WideString::fromStd(record.applicationName))
+                                                         : "<not loaded>";
         }
-        return loaded ? utf8(value) : "<not loaded>";
+        BSet set(10);
+        return set.load(wide(path(file))) ? SettingsFiles::stringAt(set, "value") : "<not loaded>";
     }
 
     // Names in the folder besides the four files.

@@ -222,20 +222,6 @@ TEST_F(TaskFileLimitsTest, OversizedOrSpecialTaskFilesReadAsDamaged)
     EXPECT_TRUE(std::filesystem::exists(path));
 }
 
-TEST_F(TaskFileLimitsTest, SaveRemovesStaleTemporariesOfTheTask)
-{
-    const std::string path = TaskFile::pathOf(m_name);
-    const std::string stale = path + ".tmp-Zz9Zz9";
-    TempDir::write(stale, "half a task");
-    TaskRecord record;
-    record.applicationName = L"/usr/bin/agent";
-    ASSERT_EQ(TaskFile::save(m_name, record), S_OK);
-    EXPECT_FALSE(std::filesystem::exists(stale));
-    TaskRecord back;
-    EXPECT_EQ(TaskFile::load(m_name, back), S_OK);
-    EXPECT_EQ(back.applicationName, record.applicationName);
-}
-
 // Numbers in text take only the digits 0-9: other scripts' digits, or characters whose low byte
 // looks like one, count for nothing.
 TEST(NumberTest, OnlyAsciiDigitsCount)
