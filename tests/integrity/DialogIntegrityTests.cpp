@@ -15,8 +15,10 @@
 
 #include <QKeyEvent>
 
+#include <pthread.h>
 #include <sys/stat.h>
 
+#include <atomic>
 #include <filesystem>
 #include <memory>
 #include <string>
@@ -284,15 +286,32 @@ TEST_F(ConfigurationTestIntegrity, ClosingTheWaitDialogAnyWayCancelsTheTest)
     QApplication::exec();
 }
 
-// A starter that loses its agent during the test shows the no-agent result.
+// A starter that loses its agent during the test shows the no-agent result. The worker that asks
+// it is detached, so it leaves nothing behind once it ends.
 TEST_F(ConfigurationTestIntegrity, NoAgentAnswerShowsNoAgent)
 {
     m_agent->setTestAnswer(-14, 0);
     ResultDialogAccepter results;
+    std::atomic<int> workerDetachState{-1};
+    // The worker's own log line is written on the worker's thread.
+    const int sink = TesselLog_Static::addSink([&workerDetachState](const TesselLog_Static::Record& record) {
+        if (utf8(record.message.c_str()).find("threadMethod_static") == std::string::npos)
+            return;
+        pthread_attr_t attributes;
+        int state = -1;
+        if (pthread_getattr_np(pthread_self(), &attributes) == 0)
+        {
+            pthread_attr_getdetachstate(&attributes, &state);
+            pthread_attr_destroy(&attributes);
+        }
+        workerDetachState = state;
+    });
     {
         OnLineUpdateCommand command(QStringLiteral("WC_ONLINEUPDATECOMMAND"));
         command.init();
     }
+    TesselLog_Static::removeSink(sink);
+    EXPECT_EQ(workerDetachState.load(), PTHREAD_CREATE_DETACHED);
     ASSERT_EQ(results.results.size(), 1u);
     EXPECT_EQ(results.results[0].preparerText, Dialog_OnLineUpdateConfigurationTestResult::defaultPreparerText(-14));
     EXPECT_NE(results.results[0].preparerText, Dialog_OnLineUpdateConfigurationTestResult::defaultPreparerText(-12));
