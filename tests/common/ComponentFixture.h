@@ -1,13 +1,18 @@
 #pragma once
 
+#include "BString.h"
 #include "CBText.h"
+#include "CComponent_Thread_NoRef.h"
 #include "CDataManager.h"
 #include "ComponentManagerFactory.h"
 #include "ID.h"
+#include "TestText.h"
 
 #include <gtest/gtest.h>
 
 #include <cstdlib>
+#include <memory>
+#include <string>
 
 // Gives each test a fresh data manager and text component, registered with the process's
 // component manager, and destroys every component afterwards. The raw pointers are observers
@@ -52,6 +57,22 @@ protected:
         return m_manager->destroyComponent(id);
     }
     int destroyDataManager() { return destroyComponent(ID(CDataManager::componentID)); }
+
+    // Puts a component in the place of `id` that hands out no proxy, so it cannot be reached
+    // (a destroyed component alone would be loaded again from its library).
+    void makeUnreachable(const ID& id)
+    {
+        destroyComponent(id);
+        ASSERT_EQ(m_manager->registerComponent(std::make_unique<CComponent_Thread_NoRef>(id),
+                                               [](IComponent*) -> ProxyComponent* { return nullptr; }),
+                  0);
+    }
+
+    // A string the library reads from the data manager (a file path, a task setting).
+    void setConfig(const wchar_t* uri, const std::string& value)
+    {
+        ASSERT_EQ(m_dataManager->createData(ID(uri), BString(wide(value))), 0);
+    }
     int destroyText() { return destroyComponent(ID(CBText::componentID)); }
 
     IComponentManager* m_manager = nullptr;
