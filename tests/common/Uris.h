@@ -13,12 +13,10 @@ const wchar_t* const kBrands = L"data:/Configuration/DoC/Config_Accueil/Brands";
 // The scheduled task and the update agent.
 const wchar_t* const kEnableOnlineUpdate = L"data:/Configuration/MenuBar/EnableOnlineUpdate";
 const wchar_t* const kExecutablePath = L"data:/Configuration/MenuBar/Preparateur/ExecutablePath";
-const wchar_t* const kParameters = L"data:/Configuration/MenuBar/Preparateur/ExecutableParameterPreparer";
 const wchar_t* const kTaskName = L"data:/Configuration/MenuBar/Preparateur/TimeScheduledTask";
 const wchar_t* const kAgentExecutable = L"data:/Configuration/OnlineUpdate/UpdateAgentExecutable";
 
 // Published records of the dialog.
-const wchar_t* const kControlPrefix = L"data:/Auto/SystemMenu/";
 const wchar_t* const kActivePreparateur = L"data:/Auto/SystemMenu/ActivePreparateur";
 const wchar_t* const kTaskTime = L"data:/Auto/SystemMenu/TaskTimeEdit";
 const wchar_t* const kUserSet = L"data:/Auto/SystemMenu/Users/UserSet";

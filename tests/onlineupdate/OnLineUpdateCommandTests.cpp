@@ -1,171 +1,190 @@
-#include "OnlineUpdateTestSupport.h"
+#include "OnLineUpdateCommand.h"
 
-#include "CScheduledTaskHelper.h"
+#include "BBool.h"
+#include "CProcStartUpdateAgent.h"
+#include "ComponentFixture.h"
+#include "Dialog_ConfigurationTestBase.h"
+#include "DialogDrivers.h"
+#include "EffectiveUser.h"
+#include "LogCapture.h"
+#include "SettingsFiles.h"
+#include "TaskFile.h"
+#include "TaskRecord.h"
+#include "TaskSchedulerFaults.h"
+#include "TaskSchedulerSettings.h"
+#include "TempDir.h"
+#include "Uris.h"
 #include "Win32Service.h"
 
-#include <QMetaMethod>
-#include <QMetaObject>
+#include <ace/Thread_Manager.h>
 
-using namespace OnlineUpdateTest;
-using namespace OnlineUpdateCommand_NS;
+#include <sys/stat.h>
 
-namespace
+#include <algorithm>
+#include <filesystem>
+#include <memory>
+#include <string>
+#include <tuple>
+
+// Reaches the command's private parts: the test's future, the worker and the wait dialog.
+class OnLineUpdateCommandTestAccess
 {
+public:
+    static std::shared_ptr<OnLineUpdateCommand::ResultFutureType> future(OnLineUpdateCommand& c)
+    {
+        return c.m_testFuture;
+    }
+    static unsigned long threadMethod(void* parameter) { return OnLineUpdateCommand::threadMethod_static(parameter); }
+    static Dialog_ConfigurationTestBase& waitDialog(OnLineUpdateCommand& c) { return c.m_waitDialog; }
+};
+
+using namespace OnlineUpdateCommand_NS;
+using Access = OnLineUpdateCommandTestAccess;
+using Results = OnLineUpdateCommand::TCheckResults;
+using ResultDialog = Dialog_OnLineUpdateConfigurationTestResult;
+
 const int kError = TesselLog_Static::eERROR;
 const int kWarning = TesselLog_Static::eWARNING;
 const int kInformation = TesselLog_Static::eINFORMATION;
 
-std::string user()
+// A fresh data manager, text component and update-agent starter, a tasks folder of the test's
+// own and a running scheduler service. The task time is 07:30:00, online updates are off.
+class OnlineUpdateFixture : public ComponentFixture
 {
-    return WideString::toUtf8(ACE_WString(EffectiveUser::loginName().c_str()));
+protected:
+    void SetUp() override
+    {
+        ComponentFixture::SetUp();
+        TaskSchedulerSettings::setTasksFolder(m_dir.file("Tasks"));
+        TaskSchedulerSettings::setServiceState(0);
+        TaskSchedulerFaults::clear();
+        m_manager->destroyComponent(ID(CProcStartUpdateAgent::componentID));
+        m_agent = CProcStartUpdateAgent::registerWith(*m_manager);
+        ASSERT_NE(m_agent, nullptr);
+        setConfig(Uri::kTaskTime, "07:30:00");
+        setEnabled(false);
+    }
+
+    void TearDown() override
+    {
+        // A worker still blocked in the gated agent is let go, then every worker is joined.
+        openGate();
+        ACE_Thread_Manager::instance()->wait();
+        TaskSchedulerFaults::clear();
+        TaskSchedulerSettings::setServiceState(0);
+        TaskSchedulerSettings::setTasksFolder(std::string());
+        ComponentFixture::TearDown();
+    }
+
+    void setEnabled(bool enabled) { ASSERT_EQ(0, m_dataManager->createData(ID(Uri::kEnableOnlineUpdate), BBool(enabled))); }
+
+    // The default task as the scheduler stores it for this user.
+    static std::wstring storedName() { return L"VEXAPreparerTask_" + EffectiveUser::loginName(); }
+    static bool taskExists() { return std::filesystem::exists(TaskFile::pathOf(storedName())); }
+
+    // Stores the default task as Create does, starting daily at `time`.
+    void writeTask(const char* time)
+    {
+        setConfig(Uri::kTaskTime, time);
+        ASSERT_TRUE(OnLineUpdateCommand("WC_TOOLCONFIGURATION").CreateScheduledTask());
+        setConfig(Uri::kTaskTime, "07:30:00");
+    }
+
+    // A real update agent that answers minus `exitStatus` once the gate file exists.
+    void useGatedAgent(int exitStatus)
+    {
+        m_gate = m_dir.file("gate");
+        const std::string script = m_dir.file("agent.sh");
+        TempDir::write(script, "#!/bin/sh\nwhile [ ! -e '" + m_gate + "' ]; do sleep 0.01; done\nexit " +
+                                   std::to_string(exitStatus) + "\n");
+        ASSERT_EQ(0, chmod(script.c_str(), 0755));
+        setConfig(Uri::kAgentExecutable, script);
+    }
+    void openGate()
+    {
+        if (!m_gate.empty())
+            TempDir::write(m_gate, "open");
+    }
+
+    CProcStartUpdateAgent* m_agent = nullptr;
+    std::string m_gate;
+    TempDir m_dir;
+    LogCapture m_log;
+};
+
+namespace
+{
+const char* const kCanceledLine =
+    "OnLineUpdateCommand::startConfigurationTestWindow: test was canceled, returning without processing results";
+
+std::string agentLine(const std::string& name)
+{
+    return "OnLineUpdateCommand::threadMethod_static: IProcStartUpdateAgent::" + name;
+}
+
+std::string taskLine(const std::string& name)
+{
+    return "OnLineUpdateCommand::startConfigurationTestWindow: OnlineUpdateCommand_NS::" + name;
+}
+
+Results delivered(OnLineUpdateCommand& command)
+{
+    Results results;
+    EXPECT_EQ(0, Access::future(command)->get(results));
+    return results;
 }
 }
 
 // ---- Parameters read from the data manager ----
 
-struct TimeCase
+// Keys set override the defaults, empty ones count as absent; task times shorter than "hh:mm" are invalid.
+TEST_F(OnlineUpdateFixture, ParametersComeFromTheDataManager)
 {
-    const char* name;
-    const char* time;
-    const char* hour;
-    const char* minute;
-    bool valid;
-};
-
-void PrintTo(const TimeCase& c, std::ostream* os)
-{
-    *os << '"' << c.time << '"';
-}
-
-class TaskTimeTest : public OnlineUpdateFixture, public ::testing::WithParamInterface<TimeCase>
-{
-};
-
-TEST_P(TaskTimeTest, TimeIsCutIntoHourAndMinuteTexts)
-{
-    setString(kTaskTimeUri, GetParam().time);
-    const ScheduledTaskParams params = getScheduledTaskParamsFromDM();
-    EXPECT_EQ(u(params.startHour()), GetParam().hour);
-    EXPECT_EQ(u(params.startMinute()), GetParam().minute);
-    EXPECT_EQ(params.isValid(), GetParam().valid);
-    EXPECT_EQ(m_log.containsSubstring("- invalid setting"), std::string(GetParam().time).size() < 5);
-    EXPECT_FALSE(m_log.containsSubstring("will attempt to init"));
-}
-
-// Texts shorter than "hh:mm" are invalid settings: the empty default parameters come back.
-const TimeCase kTimeCases[] = {
-    {"Full", "07:30:00", "07", "30", true},
-    {"NoSeconds", "07:30", "07", "30", true},
-    {"SingleDigitHour", "7:30", "", "", false},
-    {"ThreeCharacters", "7:3", "", "", false},
-    {"HourOnly", "7", "", "", false},
-    {"NotDigits", "ab:cd:ef", "ab", "cd", true},
-};
-INSTANTIATE_TEST_SUITE_P(Times, TaskTimeTest, ::testing::ValuesIn(kTimeCases),
-                         [](const auto& info) { return std::string(info.param.name); });
-
-TEST_F(OnlineUpdateFixture, EmptyKeysGiveTheDefaultTaskAgentAndParameters)
-{
-    const ScheduledTaskParams params = getScheduledTaskParamsFromDM();
-    EXPECT_EQ(u(params.applicationPath()), "C:/VEXA_Q17/Lib/Application/UpdaterAgent.exe");
-    EXPECT_EQ(u(params.parameters()), "preparer");
-    EXPECT_EQ(u(params.taskName()), "VEXAPreparerTask");
-    EXPECT_EQ(u(params.getTaskName()), "VEXAPreparerTask_" + user());
+    setConfig(Uri::kTaskTime, "07:30");
+    setConfig(Uri::kExecutablePath, "/opt/agent/UpdaterAgent");
+    setConfig(Uri::kTaskName, "");
+    ScheduledTaskParams params = getScheduledTaskParamsFromDM();
+    EXPECT_EQ(utf8(params.startHour()) + "|" + utf8(params.startMinute()), "07|30");
+    EXPECT_EQ(utf8(params.applicationPath()), "/opt/agent/UpdaterAgent");
+    EXPECT_EQ(utf8(params.getTaskName()).rfind("VEXAPreparerTask_", 0), 0u);
     EXPECT_TRUE(params.isValid());
-
-    // Keys present but empty count as absent.
-    setString(kExecutablePathUri, "");
-    setString(kParametersUri, "");
-    setString(kTaskNameUri, "");
-    EXPECT_EQ(u(getScheduledTaskParamsFromDM().getTaskName()), "VEXAPreparerTask_" + user());
+    setConfig(Uri::kTaskTime, "7:30");
+    EXPECT_FALSE(getScheduledTaskParamsFromDM().isValid());
+    EXPECT_TRUE(m_log.containsSubstring("- invalid setting", kError));
 }
 
-TEST_F(OnlineUpdateFixture, KeysOfTheDataManagerAreUsed)
-{
-    setString(kExecutablePathUri, "/opt/agent/UpdaterAgent");
-    setString(kParametersUri, "--preparer now");
-    setString(kTaskNameUri, "NightlyAgent");
-    const ScheduledTaskParams params = getScheduledTaskParamsFromDM();
-    EXPECT_EQ(u(params.applicationPath()), "/opt/agent/UpdaterAgent");
-    EXPECT_EQ(u(params.parameters()), "--preparer now");
-    EXPECT_EQ(u(params.getTaskName()), "NightlyAgent_" + user());
-}
-
-TEST_F(OnlineUpdateFixture, WithoutDataManagerTheParametersAreInvalid)
+TEST_F(OnlineUpdateFixture, WithoutDataManagerNothingCanBeDone)
 {
     destroyDataManager();
-    const ScheduledTaskParams params = getScheduledTaskParamsFromDM();
-    EXPECT_FALSE(params.isValid());
-    EXPECT_TRUE(m_log.contains("getScheduledTaskParamsFromDM: spDM is not valid", kError));
-
     OnLineUpdateCommand command("WC_TOOLCONFIGURATION");
     EXPECT_FALSE(command.CreateScheduledTask());
     EXPECT_FALSE(command.DeleteScheduledTask());
-    EXPECT_EQ(eWRONG_SETTINGS, OnLineUpdateCommandTestAccess::check(command, false));
-}
-
-// The task time comes from the dialog's controller when nobody has published it yet.
-class TaskTimeInitTest : public OnlineUpdateFixture
-{
-protected:
-    void SetUp() override
-    {
-        OnlineUpdateFixture::SetUp();
-        ASSERT_EQ(0, m_dataManager->removeData(ID(kTaskTimeUri)));
-        setString(L"data:/Configuration/MenuBar/WorkshopFile", m_dir.file("User/InformationsGarage.xml"));
-        setString(L"data:/Configuration/DoC/FicheDiagnostic/FicheDiagParamsFileName", m_dir.file("User/FicheDiagParams.xml"));
-        setString(L"data:/Configuration/MenuBar/PreparateurConfigFile", m_updatePath);
-        save(BSet(10), m_dir.file("User/FicheDiagParams.xml"));
-    }
-
-    static void save(const BSet& set, const std::string& path)
-    {
-        TempDir::write(path, "");
-        ASSERT_TRUE(set.save(WideString::fromUtf8(path), false)) << path;
-    }
-
-    const std::string m_updatePath = m_dir.file("User/OnLineUpdate/Preparateur.xml");
-};
-
-TEST_F(TaskTimeInitTest, OneInitialisationAttemptPublishesTheTime)
-{
-    BSet settings(10);
-    settings.setString(L"UpdateRetrievalTime", L"06:45:00");
-    save(settings, m_updatePath);
-
-    const ScheduledTaskParams params = getScheduledTaskParamsFromDM();
-    EXPECT_EQ(u(params.startHour()), "06");
-    EXPECT_EQ(u(params.startMinute()), "45");
-    EXPECT_TRUE(params.isValid());
-    EXPECT_TRUE(m_log.contains("getScheduledTaskParamsFromDM: uri 'data:/Auto/SystemMenu/TaskTimeEdit' does not "
-                               "exist or empty - will attempt to init",
-                               kWarning));
-    EXPECT_FALSE(m_log.containsSubstring("second failure"));
-    ACE_WString published;
-    EXPECT_EQ(0, m_dataManager->getString(ID(kTaskTimeUri), published));
-    EXPECT_EQ(u(published), "06:45:00");
-}
-
-TEST_F(TaskTimeInitTest, SecondFailureGivesInvalidParameters)
-{
-    // No settings file: the controller publishes nothing.
-    const ScheduledTaskParams params = getScheduledTaskParamsFromDM();
-    EXPECT_FALSE(params.isValid());
-    EXPECT_TRUE(params.startHour().is_empty());
-    EXPECT_TRUE(params.applicationPath().is_empty());
-    EXPECT_TRUE(m_log.containsSubstring("will attempt to init", kWarning));
-    EXPECT_TRUE(m_log.contains(
-        "getScheduledTaskParamsFromDM: unable to find task time in DM - second failure, after init attempt", kError));
-    // Exactly one attempt.
-    const std::vector<std::string> warnings = m_log.messages(kWarning);
-    EXPECT_EQ(1, std::count_if(warnings.begin(), warnings.end(), [](const std::string& m) {
-                  return m.find("will attempt to init") != std::string::npos;
-              }));
-
-    OnLineUpdateCommand command("WC_TOOLCONFIGURATION");
-    EXPECT_FALSE(command.CreateScheduledTask());
+    EXPECT_EQ(eWRONG_SETTINGS, command.checkScheduledTask());
+    EXPECT_TRUE(m_log.contains("getScheduledTaskParamsFromDM: spDM is not valid", kError));
     EXPECT_TRUE(m_log.contains("OnLineUpdateCommand::CreateScheduledTask: invalid scheduled task DM settings", kError));
-    EXPECT_FALSE(taskExists());
+}
+
+TEST_F(OnlineUpdateFixture, PublicCheckWithoutUpdateAgentIsUnknownError)
+{
+    makeUnreachable(ID(CProcStartUpdateAgent::componentID));
+    EXPECT_EQ(eUNKNOWN_ERROR, OnLineUpdateCommand("WC_ONLINEUPDATECOMMAND").checkScheduledTask());
+    EXPECT_TRUE(m_log.contains("OnLineUpdateCommand::checkScheduledTask: spPSUA is not valid", kError));
+}
+
+// Nobody has published the task time: the dialog's controller is built once to publish it.
+TEST_F(OnlineUpdateFixture, MissingTaskTimeIsPublishedByOneInitialisationAttempt)
+{
+    ASSERT_EQ(0, m_dataManager->removeData(ID(Uri::kTaskTime)));
+    setConfig(Uri::kWorkshopFile, m_dir.file("User/InformationsGarage.xml"));
+    setConfig(Uri::kUsersFile, m_dir.file("User/FicheDiagParams.xml"));
+    setConfig(Uri::kUpdateFile, m_dir.file("User/OnLineUpdate/Preparateur.xml"));
+    SettingsFiles::writeUsers(m_dir.file("User/FicheDiagParams.xml"), {});
+    SettingsFiles::Update update;
+    update.time = "06:45:00";
+    SettingsFiles::writeUpdate(m_dir.file("User/OnLineUpdate/Preparateur.xml"), update);
+    EXPECT_EQ(utf8(getScheduledTaskParamsFromDM().startMinute()), "45");
+    EXPECT_TRUE(m_log.contains("getScheduledTaskParamsFromDM: uri 'data:/Auto/SystemMenu/TaskTimeEdit' does not "
+                               "exist or empty - will attempt to init", kWarning));
 }
 
 // ---- Checking the task as the settings ask ----
@@ -174,248 +193,195 @@ struct CheckCase
 {
     const char* name;
     bool enabled;
-    bool taskBefore;
-    const char* createdLine;  // logged when the check had to make the task
-    int createdLevel;
-};
-
-void PrintTo(const CheckCase& c, std::ostream* os)
-{
-    *os << c.name;
-}
-
-class CheckTaskTest : public OnlineUpdateFixture, public ::testing::WithParamInterface<CheckCase>
-{
-};
-
-TEST_P(CheckTaskTest, TaskStaysExactlyWhenOnlineUpdatesAreEnabled)
-{
-    setEnabled(GetParam().enabled);
-    if (GetParam().taskBefore)
-        writeTask(7, 30);
-
-    OnLineUpdateCommand command("WC_ONLINEUPDATECOMMAND");
-    EXPECT_EQ(eOK, command.checkScheduledTask());
-    EXPECT_EQ(taskExists(), GetParam().enabled);
-
-    if (GetParam().createdLine != nullptr)
-    {
-        EXPECT_TRUE(m_log.containsSubstring(GetParam().createdLine, GetParam().createdLevel));
-    }
-    else
-    {
-        EXPECT_FALSE(m_log.containsSubstring("OnLineUpdateCommand::checkScheduledTask"));
-    }
-}
-
-const CheckCase kCheckCases[] = {
-    {"EnabledNoTask", true, false,
-     "OnLineUpdateCommand::checkScheduledTask: online updates were enabled in settings but task did not exist for "
-     "this windows user - we created it.",
-     kWarning},
-    {"EnabledTask", true, true, nullptr, 0},
-    {"DisabledNoTask", false, false,
-     "OnLineUpdateCommand::checkScheduledTask: successfully created temporary task for checking purposes", kInformation},
-    {"DisabledTask", false, true, nullptr, 0},
-};
-INSTANTIATE_TEST_SUITE_P(Settings, CheckTaskTest, ::testing::ValuesIn(kCheckCases),
-                         [](const auto& info) { return std::string(info.param.name); });
-
-TEST_F(OnlineUpdateFixture, TaskWithOtherTimeIsReportedAndStillFollowsTheSetting)
-{
-    writeTask(8, 15);
-    OnLineUpdateCommand command("WC_ONLINEUPDATECOMMAND");
-    EXPECT_EQ(eWRONG_SETTINGS, OnLineUpdateCommandTestAccess::check(command, true));
-    EXPECT_TRUE(taskExists());
-    EXPECT_EQ(eWRONG_SETTINGS, OnLineUpdateCommandTestAccess::check(command, false));
-    EXPECT_FALSE(taskExists());
-}
-
-TEST_F(OnlineUpdateFixture, MadeTaskStartsAtTheSetTime)
-{
-    setEnabled(true);
-    setString(kTaskTimeUri, "07:05:00");
-    OnLineUpdateCommand command("WC_ONLINEUPDATECOMMAND");
-    EXPECT_EQ(eOK, command.checkScheduledTask());
-    TaskRecord record;
-    ASSERT_TRUE(loadTask(record));
-    ASSERT_EQ(1u, record.triggers.size());
-    EXPECT_EQ(7, record.triggers[0].wStartHour);
-    EXPECT_EQ(5, record.triggers[0].wStartMinute);
-    EXPECT_EQ(std::wstring(kDefaultApplication), record.applicationName);
-}
-
-TEST_F(OnlineUpdateFixture, SlotInvocationRunsTheCheck)
-{
-    setEnabled(true);
-    OnLineUpdateCommand command("WC_ONLINEUPDATECOMMAND");
-    EXPECT_TRUE(QMetaObject::invokeMethod(&command, "checkScheduledTask"));
-    EXPECT_TRUE(taskExists());
-}
-
-// Ways the check cannot run to its end.
-struct FailureCase
-{
-    const char* name;
-    bool enabled;
-    bool taskBefore;
-    TaskSchedulerFaults::Call faultCall;  // eCALL_COUNT for none
+    bool taskBefore;  // the task stored as set
+    TaskSchedulerFaults::Call fault;  // eCALL_COUNT: none, with S_FALSE: the scheduler service stopped
     HRESULT faultResult;
-    const char* time;
-    DWORD serviceState;
     _enum_CheckConfigurationScheduledTaskResult expected;
-    const char* errorLine;  // nullptr when only the helper logs
+    const char* line;  // what the check itself logs, if anything
+    bool taskAfter;
 };
 
-void PrintTo(const FailureCase& c, std::ostream* os)
-{
-    *os << c.name;
-}
-
-class CheckFailureTest : public OnlineUpdateFixture, public ::testing::WithParamInterface<FailureCase>
+class CheckTest : public OnlineUpdateFixture, public ::testing::WithParamInterface<CheckCase>
 {
 };
 
-TEST_P(CheckFailureTest, EachFailureHasItsResult)
+// Online updates enabled, the task stays (made when missing); disabled, none is left behind.
+TEST_P(CheckTest, ResultTaskAndLogFollowTheSettings)
 {
-    const FailureCase& c = GetParam();
+    const CheckCase& c = GetParam();
+    setEnabled(c.enabled);
     if (c.taskBefore)
-        writeTask(7, 30);
-    setString(kTaskTimeUri, c.time);
-    TaskSchedulerSettings::setServiceState(c.serviceState);
-    if (c.faultCall != TaskSchedulerFaults::eCALL_COUNT)
-        TaskSchedulerFaults::inject(c.faultCall, c.faultResult);
+        writeTask("07:30:00");
+    if (c.fault != TaskSchedulerFaults::eCALL_COUNT)
+        TaskSchedulerFaults::inject(c.fault, c.faultResult);
+    else if (c.faultResult == S_FALSE)
+        TaskSchedulerSettings::setServiceState(SERVICE_STOPPED);
 
     OnLineUpdateCommand command("WC_ONLINEUPDATECOMMAND");
-    EXPECT_EQ(c.expected, OnLineUpdateCommandTestAccess::check(command, c.enabled));
-    if (c.errorLine != nullptr)
-    {
-        EXPECT_TRUE(m_log.containsSubstring(c.errorLine, kError)) << c.errorLine;
-    }
+    EXPECT_EQ(c.expected, command.checkScheduledTask());
     TaskSchedulerFaults::clear();
-    EXPECT_EQ(taskExists(), c.taskBefore);
+    EXPECT_EQ(taskExists(), c.taskAfter);
+    EXPECT_EQ(m_log.containsSubstring("OnLineUpdateCommand::checkScheduledTask"), *c.line != '\0');
+    EXPECT_TRUE(*c.line == '\0' || m_log.containsSubstring(c.line)) << c.line;
 }
 
-const FailureCase kFailureCases[] = {
-    {"InvalidSettings", true, false, TaskSchedulerFaults::eCALL_COUNT, S_OK, "7", 0, eWRONG_SETTINGS,
-     "OnLineUpdateCommand::checkScheduledTask: invalid scheduled task DM settings"},
-    {"ServiceStopped", true, false, TaskSchedulerFaults::eCALL_COUNT, S_OK, "07:30:00", SERVICE_STOPPED,
-     eCAN_NOT_ACCESS_SERVICE, nullptr},
-    {"SchedulerUnreachable", false, false, TaskSchedulerFaults::eCoCreateInstance, E_FAIL, "07:30:00", 0,
-     eUNKNOWN_ERROR,
-     "OnLineUpdateCommand::checkScheduledTask: checkTaskAvailableForCurrentUser did not complete successfully - "
-     "cannot continue"},
-    {"AccessDenied", true, false, TaskSchedulerFaults::eActivate, static_cast<HRESULT>(0x80070005), "07:30:00", 0,
-     eCAN_NOT_ACCESS_SERVICE, "OnLineUpdateCommand::checkScheduledTask: checkTaskAvailableForCurrentUser reported accessDenied"},
-    {"CreationFails", true, false, TaskSchedulerFaults::eNewWorkItem, E_FAIL, "07:30:00", 0, eUNKNOWN_ERROR,
-     "OnLineUpdateCommand::checkScheduledTask: trying to create task failed"},
-    {"DeletionFails", false, true, TaskSchedulerFaults::eDelete, E_FAIL, "07:30:00", 0, eUNKNOWN_ERROR,
-     "OnLineUpdateCommand::checkScheduledTask: trying to delete temporary task failed"},
+const TaskSchedulerFaults::Call kNone = TaskSchedulerFaults::eCALL_COUNT;
+const CheckCase kCheckCases[] = {
+    {"EnabledNoTask", true, false, kNone, S_OK, eOK, "did not exist for this windows user - we created it.", true},
+    {"DisabledNoTask", false, false, kNone, S_OK, eOK, "successfully created temporary task", false},
+    {"ServiceStopped", true, false, kNone, S_FALSE, eCAN_NOT_ACCESS_SERVICE, "", false},
+    {"SchedulerUnreachable", false, false, TaskSchedulerFaults::eCoCreateInstance, E_FAIL, eUNKNOWN_ERROR,
+     "did not complete successfully - cannot continue", false},
+    {"AccessDenied", true, false, TaskSchedulerFaults::eActivate, static_cast<HRESULT>(0x80070005),
+     eCAN_NOT_ACCESS_SERVICE, "reported accessDenied", false},
+    {"CreationFails", true, false, TaskSchedulerFaults::eNewWorkItem, E_FAIL, eUNKNOWN_ERROR,
+     "trying to create task failed", false},
+    {"DeletionFails", false, true, TaskSchedulerFaults::eDelete, E_FAIL, eUNKNOWN_ERROR,
+     "trying to delete temporary task failed", true},
 };
-INSTANTIATE_TEST_SUITE_P(Failures, CheckFailureTest, ::testing::ValuesIn(kFailureCases),
+INSTANTIATE_TEST_SUITE_P(Cases, CheckTest, ::testing::ValuesIn(kCheckCases),
                          [](const auto& info) { return std::string(info.param.name); });
-
-TEST_F(OnlineUpdateFixture, PublicCheckWithoutUpdateAgentIsUnknownError)
-{
-    makeAgentUnreachable();
-    OnLineUpdateCommand command("WC_ONLINEUPDATECOMMAND");
-    EXPECT_EQ(eUNKNOWN_ERROR, command.checkScheduledTask());
-    EXPECT_TRUE(m_log.contains("OnLineUpdateCommand::checkScheduledTask: spPSUA is not valid", kError));
-    EXPECT_FALSE(taskExists());
-}
 
 // ---- Create and Delete ----
 
-class CreateDeleteTest : public OnlineUpdateFixture, public ::testing::WithParamInterface<bool>
+TEST_F(OnlineUpdateFixture, CreateRewritesTheTaskAndAFailedDeletionOnceReachedCountsAsDone)
 {
-protected:
-    // With the parameter false the text component is gone before the command is made.
-    std::unique_ptr<OnLineUpdateCommand> makeCommand()
-    {
-        if (!GetParam())
-            destroyText();
-        auto command = std::make_unique<OnLineUpdateCommand>("WC_TOOLCONFIGURATION");
-        EXPECT_EQ(!GetParam(),
-                  m_log.contains("OnLineUpdateCommand::OnLineUpdateCommand: Cannot get proxy to BText.", kWarning));
-        return command;
-    }
-};
-
-TEST_P(CreateDeleteTest, CreateSavesAndRewritesTheTask)
-{
-    auto command = makeCommand();
-    EXPECT_TRUE(command->CreateScheduledTask());
+    OnLineUpdateCommand command("WC_TOOLCONFIGURATION");
+    EXPECT_TRUE(command.CreateScheduledTask());
+    setConfig(Uri::kTaskTime, "21:05:00");
+    EXPECT_TRUE(command.CreateScheduledTask());
     TaskRecord record;
-    ASSERT_TRUE(loadTask(record));
-    EXPECT_EQ(30, record.triggers.at(0).wStartMinute);
-
-    setString(kTaskTimeUri, "21:05:00");
-    EXPECT_TRUE(command->CreateScheduledTask());
-    ASSERT_TRUE(loadTask(record));
+    ASSERT_EQ(S_OK, TaskFile::load(storedName(), record));
     ASSERT_EQ(1u, record.triggers.size());
-    EXPECT_EQ(21, record.triggers[0].wStartHour);
-    EXPECT_EQ(5, record.triggers[0].wStartMinute);
-    EXPECT_EQ(eOK, OnLineUpdateCommandTestAccess::check(*command, true));
-}
+    EXPECT_EQ(21 * 60 + 5, record.triggers[0].wStartHour * 60 + record.triggers[0].wStartMinute);
 
-TEST_P(CreateDeleteTest, DeleteRemovesTheTaskAndToleratesItsAbsence)
-{
-    auto command = makeCommand();
-    writeTask(7, 30);
-    EXPECT_TRUE(command->DeleteScheduledTask());
-    EXPECT_FALSE(taskExists());
-    EXPECT_TRUE(command->DeleteScheduledTask());
-    EXPECT_FALSE(m_log.containsSubstring("invalid scheduled task DM settings"));
-}
-
-TEST_P(CreateDeleteTest, InvalidSettingsAreRefused)
-{
-    auto command = makeCommand();
-    writeTask(7, 30);
-    setString(kTaskTimeUri, "7:");
-    EXPECT_FALSE(command->CreateScheduledTask());
-    EXPECT_TRUE(m_log.contains("OnLineUpdateCommand::CreateScheduledTask: invalid scheduled task DM settings", kError));
-    EXPECT_FALSE(command->DeleteScheduledTask());
-    EXPECT_TRUE(m_log.contains("OnLineUpdateCommand::DeleteScheduledTask: invalid scheduled task DM settings", kError));
-    EXPECT_TRUE(taskExists());
-}
-
-TEST_P(CreateDeleteTest, UnreachableSchedulerFailsBoth)
-{
-    auto command = makeCommand();
-    TaskSchedulerFaults::inject(TaskSchedulerFaults::eCoCreateInstance, E_FAIL);
-    EXPECT_FALSE(command->CreateScheduledTask());
-    EXPECT_FALSE(command->DeleteScheduledTask());
-    TaskSchedulerFaults::clear();
-    EXPECT_FALSE(taskExists());
-}
-
-TEST_P(CreateDeleteTest, FailedDeletionOnceReachedStillCountsAsDone)
-{
-    auto command = makeCommand();
-    writeTask(7, 30);
     TaskSchedulerFaults::inject(TaskSchedulerFaults::eDelete, E_FAIL);
-    EXPECT_TRUE(command->DeleteScheduledTask());
+    EXPECT_TRUE(command.DeleteScheduledTask());
     TaskSchedulerFaults::clear();
     EXPECT_TRUE(taskExists());
+    EXPECT_TRUE(command.DeleteScheduledTask());
+    EXPECT_FALSE(taskExists());
+    EXPECT_TRUE(command.DeleteScheduledTask());
 }
 
-INSTANTIATE_TEST_SUITE_P(TextComponent, CreateDeleteTest, ::testing::Bool(),
-                         [](const auto& info) { return std::string(info.param ? "Present" : "Missing"); });
+// ---- The worker's mapping of the update agent's answers ----
 
-// ---- Meta-object ----
-
-TEST(OnLineUpdateCommandMeta, TwoSlotsInOrderAndNoSignals)
+TEST_F(OnlineUpdateFixture, WorkerRefusesNoParameterAndMapsAnswersOutOfRangeToMinus12)
 {
-    const QMetaObject& meta = OnLineUpdateCommand::staticMetaObject;
-    EXPECT_STREQ("OnLineUpdateCommand", meta.className());
-    ASSERT_EQ(2, meta.methodCount() - meta.methodOffset());
-    EXPECT_EQ(QByteArray("onCancelClicked()"), meta.method(meta.methodOffset()).methodSignature());
-    EXPECT_EQ(QByteArray("checkScheduledTask()"), meta.method(meta.methodOffset() + 1).methodSignature());
-    for (int i = meta.methodOffset(); i < meta.methodCount(); ++i)
+    const std::tuple<int, int, const char*> answers[] = {{0, 0, "eOK"},
+                                                         {-3, -3, "eNOK_INVALID_CONFIGURATION_FILE"},
+                                                         {-13, -13, "eNOK_MISSING_UPDATE_AGENT"},
+                                                         {1, -12, "eNOK_DISTRIBUTION_FOLDER_UNKNOWN_ERROR"},
+                                                         {-40, -12, "eNOK_DISTRIBUTION_FOLDER_UNKNOWN_ERROR"}};
+    EXPECT_EQ(666ul, Access::threadMethod(nullptr));
+    EXPECT_TRUE(m_log.contains("OnLineUpdateCommand::threadMethod_static: incorrect thread method parameter", kError));
+    for (const auto& [answer, expected, name] : answers)
     {
-        EXPECT_EQ(QMetaMethod::Slot, meta.method(i).methodType());
-        EXPECT_EQ(QMetaMethod::Public, meta.method(i).access());
+        SCOPED_TRACE(answer);
+        m_log.clear();
+        m_agent->setTestAnswer(answer, 0);
+        const auto future = std::make_shared<OnLineUpdateCommand::ResultFutureType>();
+        EXPECT_EQ(0ul, Access::threadMethod(new std::shared_ptr<OnLineUpdateCommand::ResultFutureType>(future)));
+        Results results;
+        ASSERT_EQ(0, future->get(results));
+        EXPECT_TRUE(results.testCompleted);
+        EXPECT_EQ(expected, results.preparerResult);
+        EXPECT_TRUE(m_log.contains(agentLine(name), expected == 0 ? kInformation : kError));
+        EXPECT_EQ(1, future.use_count()) << "the worker has given back its hold";
     }
-    EXPECT_EQ(0, meta.propertyCount() - meta.propertyOffset());
+}
+
+// ---- The whole test through the real dialogs ----
+
+TEST_F(OnlineUpdateFixture, ResultDialogShowsTheAgentsAnswerAndTheTaskCheck)
+{
+    ResultDialogAccepter accepter;
+    // Updates on, a task at another time, and the real agent answering -9.
+    setEnabled(true);
+    writeTask("09:00:00");
+    useGatedAgent(9);
+    openGate();
+    {
+        OnLineUpdateCommand command("WC_ONLINEUPDATECOMMAND");
+        EXPECT_TRUE(command.init());
+        EXPECT_FALSE(Access::waitDialog(command).isVisible());
+        EXPECT_EQ(-9, delivered(command).preparerResult);
+    }
+    EXPECT_TRUE(m_log.contains(taskLine("eWRONG_SETTINGS"), kError));
+    EXPECT_TRUE(taskExists());
+
+    // Updates off, the task as set, and the answer 0: the task is checked, then removed.
+    setEnabled(false);
+    writeTask("07:30:00");
+    m_agent->setTestAnswer(0, 0);
+    OnLineUpdateCommand command("WC_ONLINEUPDATECOMMAND");
+    EXPECT_TRUE(command.init());
+    EXPECT_TRUE(m_log.contains(taskLine("eOK"), kInformation));
+    EXPECT_FALSE(taskExists());
+    ASSERT_EQ(2u, accepter.results.size());
+    EXPECT_EQ(accepter.results[0].preparerText, ResultDialog::defaultPreparerText(-9));
+    EXPECT_EQ(accepter.results[0].taskText, ResultDialog::defaultTaskText(eWRONG_SETTINGS));
+    EXPECT_EQ(accepter.results[1].taskText, ResultDialog::defaultTaskText(eOK));
+    EXPECT_TRUE(accepter.results[1].ranModally);
+    EXPECT_FALSE(m_log.containsSubstring(kCanceledLine));
+}
+
+// ---- Cancel ----
+
+TEST_F(OnlineUpdateFixture, CancelBeforeTheAnswerEndsTheTestAndTheLateAnswerIsDropped)
+{
+    ResultDialogAccepter accepter;
+    useGatedAgent(3);
+    auto command = std::make_unique<OnLineUpdateCommand>("WC_ONLINEUPDATECOMMAND");
+    Dialog_ConfigurationTestBase* wait = &Access::waitDialog(*command);
+    ModalDriver::whenShown([wait](QWidget& modal) {
+        EXPECT_EQ(&modal, wait) << "the wait dialog is modal while the GUI thread waits";
+        wait->cancelButton()->click();
+    });
+    EXPECT_TRUE(command->init());
+
+    EXPECT_TRUE(accepter.results.empty());
+    EXPECT_TRUE(m_log.contains(kCanceledLine, kWarning));
+    EXPECT_FALSE(m_log.containsSubstring(taskLine(""))) << "no task check after a cancel";
+
+    // The worker outlives the command and ends by itself once the agent answers.
+    const auto future = Access::future(*command);
+    command.reset();
+    openGate();
+    ACE_Thread_Manager::instance()->wait();
+    EXPECT_TRUE(m_log.contains(agentLine("eNOK_INVALID_CONFIGURATION_FILE"), kError));
+    Results results;
+    ASSERT_EQ(0, future->get(results));
+    EXPECT_TRUE(results.canceled);
+    EXPECT_EQ(1, future.use_count());
+}
+
+// Canceling once the worker has delivered, or with cancel not wired (no text component), keeps
+// the worker's answer.
+TEST_F(OnlineUpdateFixture, LateOrUnwiredCancelKeepsTheWorkersAnswer)
+{
+    ResultDialogAccepter accepter;
+    useGatedAgent(2);
+    for (const bool withText : {true, false})
+    {
+        if (!withText)
+            destroyText();
+        std::filesystem::remove(m_gate);
+        OnLineUpdateCommand command("WC_ONLINEUPDATECOMMAND");
+        ModalDriver::whenShown([&](QWidget&) {
+            if (withText)
+            {
+                openGate();
+                delivered(command);
+            }
+            Access::waitDialog(command).cancelButton()->click();
+            openGate();
+        });
+        EXPECT_TRUE(command.init());
+        EXPECT_TRUE(delivered(command).testCompleted);
+    }
+    ASSERT_EQ(2u, accepter.results.size());
+    EXPECT_EQ(accepter.results[1].preparerText, ResultDialog::defaultPreparerText(-2));
+    EXPECT_FALSE(m_log.containsSubstring(kCanceledLine));
+    EXPECT_TRUE(m_log.contains("OnLineUpdateCommand::OnLineUpdateCommand: Cannot get proxy to BText.", kWarning));
 }

@@ -1,102 +1,88 @@
 #pragma once
 
-#include "LogCapture.h"
-#include "TempDir.h"
-
 #include "CScheduledTaskHelper.h"
+#include "ComPtr.h"
 #include "EffectiveUser.h"
+#include "LogCapture.h"
 #include "TaskFile.h"
 #include "TaskScheduler.h"
 #include "TaskSchedulerFaults.h"
+#include "TempDir.h"
+#include "TestText.h"
 #include "Win32Service.h"
-#include "Win32System.h"
-
-#include "WideString.h"
 
 #include <gtest/gtest.h>
 
 #include <cstring>
-#include <string>
 #include <vector>
 
-inline std::string toUtf8(const std::wstring& text)
-{
-    return WideString::toUtf8(text.c_str());
-}
-inline std::string toUtf8(const wchar_t* text)
-{
-    return WideString::toUtf8(text);
-}
+using namespace OnlineUpdateCommand_NS;
+using Faults = TaskSchedulerFaults;
+using Lines = std::vector<std::string>;
 
-// Each test gets its own tasks folder, a running service, no faults and a log capture.
-class ScheduledTaskFixture : public ::testing::Test
+const wchar_t kApp[] = L"/opt/agent/UpdaterAgent";
+enum Op { kCreate, kDelete, kAvailable, kCheck };
+
+// Each test gets its own tasks folder, a log capture and a helper for the task "UpdTask" running
+// kApp with "preparer" daily at 07:05.
+class ScheduledTaskTest : public ::testing::Test
 {
 public:
-    void SetUp() override
-    {
-        TaskSchedulerSettings::setTasksFolder(m_dir.file("Tasks"));
-        TaskSchedulerSettings::setServiceState(0);
-        TaskSchedulerFaults::clear();
-    }
+    void SetUp() override { TaskSchedulerSettings::setTasksFolder(m_dir.file("Tasks")); }
     void TearDown() override
     {
-        TaskSchedulerFaults::clear();
+        Faults::clear();
         TaskSchedulerSettings::setServiceState(0);
         TaskSchedulerSettings::setTasksFolder(std::string());
+        EXPECT_EQ(CoGetInitializeCount(), 0); // every operation leaves the apartment it entered
     }
 
     static std::wstring user() { return EffectiveUser::loginName(); }
-    static std::string userUtf8() { return toUtf8(user()); }
-    static std::wstring storedName(const std::wstring& base) { return base + L"_" + user(); }
+    static std::wstring storedName() { return L"UpdTask_" + user(); }
+    static std::string stored() { return utf8(storedName().c_str()); }
+    static std::string taskPath() { return TaskFile::pathOf(storedName()); }
 
-    static TASK_TRIGGER trigger(TASK_TRIGGER_TYPE type, WORD hour, WORD minute)
+    // One operation, without its fail flag; the availability check answers 0 when it fails,
+    // else 1, plus 2 when the task exists and 4 when access was denied.
+    static int run(CScheduledTaskHelper& helper, Op op)
+    {
+        bool exists = false, denied = false;
+        if (op == kAvailable)
+            return helper.checkTaskAvailableForCurrentUser(exists, denied) ? 1 + 2 * exists + 4 * denied : 0;
+        return op == kCreate ? helper.createScheduledTask(false)
+                             : op == kDelete ? helper.deleteScheduledTask(false) : helper.checkScheduledTask();
+    }
+
+    // Starting on 2024-03-14, every day or week.
+    static TASK_TRIGGER trigger(TASK_TRIGGER_TYPE type, WORD hour, WORD minute, WORD year = 2024, WORD month = 3, WORD day = 14)
     {
         TASK_TRIGGER t;
         std::memset(&t, 0, sizeof t);
         t.cbTriggerSize = sizeof(TASK_TRIGGER);
-        t.wBeginYear = 2024;
-        t.wBeginMonth = 3;
-        t.wBeginDay = 14;
-        t.wStartHour = hour;
-        t.wStartMinute = minute;
+        t.wBeginYear = year, t.wBeginMonth = month, t.wBeginDay = day, t.wStartHour = hour, t.wStartMinute = minute;
         t.TriggerType = type;
-        if (type == TASK_TIME_TRIGGER_DAILY)
-            t.Type.Daily.DaysInterval = 1;
-        if (type == TASK_TIME_TRIGGER_WEEKLY)
-        {
-            t.Type.Weekly.WeeksInterval = 1;
-            t.Type.Weekly.rgfDaysOfTheWeek = 0x2;
-        }
+        t.Type.Daily.DaysInterval = 1; // in the place of a weekly trigger's WeeksInterval
         return t;
     }
 
     // A task record as the helper writes it for the standard parameters.
     static TaskRecord goodRecord()
     {
-        TaskRecord record;
-        record.applicationName = L"/opt/agent/UpdaterAgent";
-        record.parameters = L"preparer";
-        record.account = user();
-        record.flags = 0x2001;
-        record.triggers.push_back(trigger(TASK_TIME_TRIGGER_DAILY, 7, 5));
-        return record;
+        return {kApp, L"preparer", user(), L"", TASK_FLAG_INTERACTIVE | TASK_FLAG_RUN_ONLY_IF_LOGGED_ON, SCHED_S_TASK_HAS_NOT_RUN,
+                {trigger(TASK_TIME_TRIGGER_DAILY, 7, 5)}};
     }
 
-    // Writes a task file directly, as the scheduler would, owned by `owner`.
-    void writeTask(const std::wstring& name, const TaskRecord& record, const std::wstring& owner)
+    // Writes the task file directly, as the scheduler would, owned by `owner` (default: the user).
+    static void writeTask(const TaskRecord& record, const std::string& owner = "")
     {
-        ASSERT_EQ(S_OK, TaskFile::save(name, record));
-        if (owner == user())
-            return;
-        const std::string path = TaskFile::pathOf(name);
-        std::string content = TempDir::read(path);
-        const std::string from = "owner=\"" + userUtf8() + "\"";
-        const size_t at = content.find(from);
-        ASSERT_NE(std::string::npos, at);
-        content.replace(at, from.size(), "owner=\"" + toUtf8(owner) + "\"");
-        TempDir::write(path, content);
+        ASSERT_EQ(TaskFile::save(storedName(), record), S_OK);
+        std::string content = TempDir::read(taskPath()), from = "owner=\"" + utf8(user().c_str()) + "\"";
+        if (!owner.empty())
+            TempDir::write(taskPath(), content.replace(content.find(from), from.size(), "owner=\"" + owner + "\""));
     }
 
     TempDir m_dir;
     LogCapture m_log;
+    ScheduledTaskParams m_params{L"UpdTask", kApp, L"preparer", L"07", L"05"};
+    CScheduledTaskHelper m_helper{m_params};
 };

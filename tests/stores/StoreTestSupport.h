@@ -1,60 +1,51 @@
 #pragma once
 
-#include "BSet.h"
 #include "LogCapture.h"
+#include "SettingsFiles.h"
 #include "TempDir.h"
-#include "WideString.h"
+#include "TestText.h"
 
-#include <ace/SString.h>
+#include <gtest/gtest.h>
 
+#include <memory>
 #include <string>
+#include <vector>
 
-// Small helpers shared by the store tests: XML entries in the data library's layout and
-// conversions between the tests' UTF-8 text and the stores' wide strings.
 namespace StoreTest
 {
-inline ACE_WString w(const std::string& utf8)
-{
-    return WideString::fromUtf8(utf8);
-}
+const int kWarning = TesselLog_Static::eWARNING;
+const int kError = TesselLog_Static::eERROR;
 
-inline std::string u(const ACE_WString& text)
-{
-    return WideString::toUtf8(text);
-}
-
+// Settings-file text in the data library's XML layout, for contents the SettingsFiles writers
+// do not make (gaps, free slots, unknown or mistyped keys).
 inline std::string typed(const std::string& type, const std::string& key, const std::string& value)
 {
     return "<" + type + " key=\"" + key + "\">" + value + "</" + type + ">";
 }
+inline std::string str(const std::string& key, const std::string& value) { return typed("String", key, value); }
 
-inline std::string str(const std::string& key, const std::string& value)
+// A temporary folder, a log capture, and a store of type Store on a settings file in it.
+template <class Store, class Base = ::testing::Test>
+class StoreFixture : public Base
 {
-    return typed("String", key, value);
-}
+protected:
+    std::string path() const { return m_dir.file("Data/User/settings.xml"); }
+    // A store loaded from a file holding `children`.
+    Store& loaded(const std::string& children)
+    {
+        TempDir::write(path(), "<?xml version=\"1.0\" encoding=\"UTF-8\"?><BSet>" + children + "</BSet>");
+        return reread();
+    }
+    // A fresh store loaded from the file as it is now.
+    Store& reread()
+    {
+        m_store = std::make_unique<Store>(wide(path()));
+        EXPECT_TRUE(m_store->load());
+        return *m_store;
+    }
 
-inline std::string set(const std::string& key, const std::string& children)
-{
-    return typed("Set", key, children);
-}
-
-inline std::string document(const std::string& children)
-{
-    return "<?xml version=\"1.0\" encoding=\"UTF-8\"?><BSet>" + children + "</BSet>";
-}
-
-// The set saved at path, read back through the data library.
-inline BSet readBack(const std::string& path)
-{
-    BSet result(10);
-    result.load(w(path));
-    return result;
-}
-
-inline std::string stringAt(const BSet& set, const std::string& key)
-{
-    ACE_WString value;
-    set.getString(w(key), value);
-    return u(value);
-}
+    TempDir m_dir;
+    LogCapture m_log;
+    std::unique_ptr<Store> m_store;
+};
 }

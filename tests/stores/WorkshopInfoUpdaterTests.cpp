@@ -1,424 +1,177 @@
+#include "UpdateUpdater.h"
+#include "UsersUpdater.h"
 #include "WorkshopInfoUpdater.h"
 
-#include "BString.h"
 #include "ComponentFixture.h"
 #include "StoreTestSupport.h"
-
-#include <gtest/gtest.h>
+#include "Uris.h"
 
 #include <filesystem>
 #include <functional>
-#include <memory>
-#include <string>
+#include <tuple>
 
 using namespace StoreTest;
 
 namespace
 {
-const int kWarning = TesselLog_Static::eWARNING;
-const int kError = TesselLog_Static::eERROR;
+using WorkshopInfoUpdaterTest = StoreFixture<WorkshopInfoUpdater>;
+using Getter = const ACE_WString (WorkshopInfoUpdater::*)();
+using Setter = bool (WorkshopInfoUpdater::*)(const ACE_WString&);
 
-std::string flag(bool value)
-{
-    return value ? "true" : "false";
-}
-
-class WorkshopInfoUpdaterTest : public ::testing::Test
-{
-protected:
-    std::string path() const { return m_dir.file("Data/User/InformationsGarage.xml"); }
-    void writeFile(const std::string& children) { TempDir::write(path(), document(children)); }
-
-    TempDir m_dir;
-    LogCapture m_log;
+// Key, method name without "get" or "set", getter, setter.
+const std::tuple<const char*, const char*, Getter, Setter> kFields[] = {
+    {"numero_affaire", "BusinessNumber", &WorkshopInfoUpdater::getBusinessNumber, &WorkshopInfoUpdater::setBusinessNumber},
+    {"raison_sociale", "CorporateName", &WorkshopInfoUpdater::getCorporateName, &WorkshopInfoUpdater::setCorporateName},
+    {"nom", "Name", &WorkshopInfoUpdater::getName, &WorkshopInfoUpdater::setName},
+    {"rue", "Road", &WorkshopInfoUpdater::getRoad, &WorkshopInfoUpdater::setRoad},
+    {"ville", "Town", &WorkshopInfoUpdater::getTown, &WorkshopInfoUpdater::setTown},
+    {"codepostal", "PostalCode", &WorkshopInfoUpdater::getPostalCode, &WorkshopInfoUpdater::setPostalCode},
+    {"telephone", "Telephone", &WorkshopInfoUpdater::getTelephone, &WorkshopInfoUpdater::setTelephone},
+    {"telecopie", "Fax", &WorkshopInfoUpdater::getFax, &WorkshopInfoUpdater::setFax},
+    {"default_brand", "DefaultBrand", &WorkshopInfoUpdater::getDefaultBrand, &WorkshopInfoUpdater::setDefaultBrand},
 };
 
-// ---- not loaded (malformed file) ----
-
-struct NotLoadedCase
+// On a file that does not parse, every call of the three stores is refused with its safe answer,
+// logs one "not loaded" line, and nothing is written.
+TEST(NotLoadedStores, RefuseEveryCallAndKeepTheFile)
 {
-    const char* name;
-    std::function<std::string(WorkshopInfoUpdater&)> call;
-    std::string result;
-};
-
-void PrintTo(const NotLoadedCase& c, std::ostream* os)
-{
-    *os << c.name;
-}
-
-class WorkshopInfoUpdaterNotLoaded : public WorkshopInfoUpdaterTest,
-                                     public ::testing::WithParamInterface<NotLoadedCase>
-{
-};
-
-TEST_P(WorkshopInfoUpdaterNotLoaded, RefusesWithItsErrorAndLeavesTheFile)
-{
-    const std::string malformed = "<BSet><String key=\"nom\">Garage</String>";
-    TempDir::write(path(), malformed);
-    WorkshopInfoUpdater store(w(path()));
-    EXPECT_FALSE(store.load());
-    ASSERT_FALSE(store.isLoaded());
-    m_log.clear();
-
-    const NotLoadedCase& c = GetParam();
-    EXPECT_EQ(c.call(store), c.result);
-    const auto records = m_log.records();
-    ASSERT_EQ(records.size(), 1u);
-    EXPECT_EQ(records[0].level, kError);
-    EXPECT_EQ(records[0].code, -1);
-    EXPECT_EQ(records[0].className, "WorkshopInfoUpdater");
-    EXPECT_EQ(u(records[0].message), "WorkshopInfoUpdater::" + std::string(c.name) + ": not loaded");
-
-    EXPECT_FALSE(store.save());
-    EXPECT_EQ(TempDir::read(path()), malformed);
-}
-
-#define TEXT_CASES(Get, Set)                                                                        \
-    NotLoadedCase{#Get, [](WorkshopInfoUpdater& s) { return u(s.Get()); }, ""},                     \
-        NotLoadedCase                                                                               \
-    {                                                                                               \
-        #Set, [](WorkshopInfoUpdater& s) { return flag(s.Set(w("x"))); }, "false"                   \
+    TempDir dir;
+    LogCapture log;
+    const std::string path = dir.file("settings.xml"), malformed = "<BSet><String key=\"nom\">A2A</String>";
+    TempDir::write(path, malformed);
+    UpdateUpdater u(wide(path));
+    UsersUpdater s(wide(path));
+    WorkshopInfoUpdater w(wide(path));
+    EXPECT_FALSE(u.load() || s.load() || w.load() || w.isLoaded() || s.isLoaded());
+    BSet infos(10);
+    const auto none = [](const ACE_WString& text) { return text.length() == 0; };
+#define R(expression) [&] { return expression; }
+    std::vector<std::function<bool()>> calls = {
+        R(u.getCheckInternet()), R(!u.setCheckInternet(true)), R(none(u.getDeploymentMode())), R(!u.setDeploymentMode(L"x"_w)),
+        R(none(u.getDistributionFolderPath())), R(!u.setDistributionFolderPath(L"x"_w)), R(none(u.getLocalDistributionFolderPath())),
+        R(!u.setLocalDistributionFolderPath(L"x"_w)), R(none(u.getTaskTime())), R(!u.setTaskTime(L"x"_w)), R(none(u.getUpdateRetrievalTime())),
+        R(none(u.getFeedbackFolderPath())), R(u.getErrorCounter() == 0), R(u.getMaxLogsNumber() == 0), R(!u.getLogDebug()),
+        R(!u.save(wide(path))), R(!s.save()), R(s.getUserCount() == 0), R(none(s.getUserName(25))), R(none(s.getUserAddress(0))),
+        R(none(s.getUserPhone(0))), R(!s.addUser(L""_w, L"a"_w, L"p"_w)), R(!s.removeAllUsers()), R(!s.doesUserExist(L""_w)),
+        R(!s.isActivated()), R(!s.activate(true)), R(!s.setApp2AppParams(L"1"_w, L"2"_w, L"3"_w)), R(none(s.getApp2AppPort())),
+        R(none(s.getApp2AppIP())), R(none(s.getApp2AppDealerID())), R(s.getApp2AppNumRetries() == -1), R(s.getApp2AppTimeout() == -1.0),
+        R(!w.getNewDocuviaMode()), R(!w.setNewDocuviaMode(true)), R(!w.getMarvaneIDPInfos(infos)), R(!w.setMarvaneIDPInfos(infos)),
+        R(!w.save())};
+#undef R
+    for (const auto& field : kFields)
+        calls.insert(calls.end(), {[&, get = std::get<2>(field)] { return none((w.*get)()); }, [&, set = std::get<3>(field)] { return !(w.*set)(L"x"_w); }});
+    for (size_t i = 0; i < calls.size(); ++i)
+    {
+        log.clear();
+        EXPECT_TRUE(calls[i]() && log.messages(kWarning).size() + log.messages(kError).size() == 1 && log.containsSubstring("not loaded")) << i;
     }
+    EXPECT_TRUE(s.getMaxUserCount() == 20u && s.getApp2AppReqAttrs().isEmpty()); // no App2App defaults either
+    EXPECT_EQ(TempDir::read(path), malformed);
+}
 
-const NotLoadedCase kNotLoadedCases[] = {
-    TEXT_CASES(getBusinessNumber, setBusinessNumber),
-    TEXT_CASES(getCorporateName, setCorporateName),
-    TEXT_CASES(getName, setName),
-    TEXT_CASES(getRoad, setRoad),
-    TEXT_CASES(getTown, setTown),
-    TEXT_CASES(getPostalCode, setPostalCode),
-    TEXT_CASES(getTelephone, setTelephone),
-    TEXT_CASES(getFax, setFax),
-    TEXT_CASES(getDefaultBrand, setDefaultBrand),
-    {"getNewDocuviaMode", [](WorkshopInfoUpdater& s) { return flag(s.getNewDocuviaMode()); }, "false"},
-    {"setNewDocuviaMode", [](WorkshopInfoUpdater& s) { return flag(s.setNewDocuviaMode(true)); }, "false"},
-    {"getMarvaneIDPInfos",
-     [](WorkshopInfoUpdater& s) {
-         BSet infos(10);
-         return flag(s.getMarvaneIDPInfos(infos));
-     },
-     "false"},
-    {"setMarvaneIDPInfos", [](WorkshopInfoUpdater& s) { return flag(s.setMarvaneIDPInfos(BSet(10))); }, "false"},
-    {"save", [](WorkshopInfoUpdater& s) { return flag(s.save()); }, "false"},
-};
-
-INSTANTIATE_TEST_SUITE_P(Operations, WorkshopInfoUpdaterNotLoaded, ::testing::ValuesIn(kNotLoadedCases),
-                         [](const auto& info) { return std::string(info.param.name); });
-
-// ---- missing file ----
-
+// A missing file, or a folder in its place, gives an empty loaded store; save makes the folder,
+// and refuses while a file is in its way.
 TEST_F(WorkshopInfoUpdaterTest, MissingFileGivesEmptyLoadedStoreThatSaveCreates)
 {
-    WorkshopInfoUpdater store(w(path()));
-    EXPECT_FALSE(store.load());
-    EXPECT_TRUE(store.isLoaded());
-    EXPECT_TRUE(m_log.contains("WorkshopInfoUpdater::load: file '" + path() +
-                                   "' does not exist, setting state to empty BSet",
-                               kWarning));
-    EXPECT_EQ(u(store.getName()), "");
-    EXPECT_EQ(u(store.getFax()), "");
-    EXPECT_FALSE(store.getNewDocuviaMode());
-    EXPECT_TRUE(store.setName(w("Garage Żółć")));
-    EXPECT_TRUE(store.setNewDocuviaMode(true));
-    EXPECT_FALSE(std::filesystem::exists(m_dir.path() / "Data"));
-
-    ASSERT_TRUE(store.save());
-    const BSet saved = readBack(path());
-    EXPECT_EQ(stringAt(saved, "nom"), "Garage Żółć");
-    bool mode = false;
-    EXPECT_EQ(saved.getBool(w("new_docuvia_mode"), mode), 0);
-    EXPECT_TRUE(mode);
-    EXPECT_EQ(saved.size(), 2);
-}
-
-TEST_F(WorkshopInfoUpdaterTest, FolderAtTheFilePathIsHandledAsMissingFile)
-{
     std::filesystem::create_directories(path());
-    WorkshopInfoUpdater store(w(path()));
+    WorkshopInfoUpdater onFolder(wide(path()));
+    EXPECT_FALSE(onFolder.load());
+    EXPECT_TRUE(onFolder.isLoaded() && m_log.containsSubstring("does not exist, setting state to empty BSet", kWarning));
+    std::filesystem::remove_all(m_dir.file("Data"));
+    WorkshopInfoUpdater store(wide(path()));
     EXPECT_FALSE(store.load());
     EXPECT_TRUE(store.isLoaded());
-    EXPECT_TRUE(m_log.containsSubstring("does not exist, setting state to empty BSet", kWarning));
-    EXPECT_TRUE(store.setTown(w("Lyon")));
-    EXPECT_EQ(u(store.getTown()), "Lyon");
-}
-
-TEST_F(WorkshopInfoUpdaterTest, FileInTheWayOfTheFolderMakesSaveRefuseUntilRemoved)
-{
+    BSet infos(10);
+    EXPECT_FALSE(store.getNewDocuviaMode() || store.getMarvaneIDPInfos(infos)); // error 1: no such key
+    EXPECT_TRUE(m_log.contains("WorkshopInfoUpdater::getMarvaneIDPInfosm_BSet.get('IDP_Infos') failed with error '1')", kError));
+    EXPECT_TRUE(store.setName(wide("Garage Żółć")) && store.setNewDocuviaMode(true));
     TempDir::write(m_dir.file("Data"), "not a folder");
-    WorkshopInfoUpdater store(w(path()));
-    store.load();
-    ASSERT_TRUE(store.setName(w("Garage")));
     EXPECT_FALSE(store.save());
-    EXPECT_TRUE(m_log.contains("WorkshopInfoUpdater::save: could not create parent folder for file '" + path() + "'",
-                               kWarning));
-    EXPECT_TRUE(store.isLoaded());
-
+    EXPECT_TRUE(m_log.contains("WorkshopInfoUpdater::save: could not create parent folder for file '" + path() + "'", kWarning));
     std::filesystem::remove(m_dir.file("Data"));
     ASSERT_TRUE(store.save());
-    EXPECT_EQ(stringAt(readBack(path()), "nom"), "Garage");
+    bool mode = false;
+    const BSet saved = SettingsFiles::read(path());
+    EXPECT_TRUE(SettingsFiles::stringAt(saved, "nom") == "Garage Żółć" && saved.getBool(L"new_docuvia_mode"_w, mode) == 0 && mode && saved.size() == 2);
 }
 
-TEST_F(WorkshopInfoUpdaterTest, BareFileNameIsNotSaved)
+// Each text field reads and writes its own key; the identity provider's infos must be a set.
+TEST_F(WorkshopInfoUpdaterTest, FieldsRoundTripAndASecondLoadKeepsEdits)
 {
-    WorkshopInfoUpdater store(w("InformationsGarage-never-written.xml"));
-    store.load();
-    EXPECT_FALSE(store.save());
-    EXPECT_FALSE(std::filesystem::exists("InformationsGarage-never-written.xml"));
-}
-
-// ---- loaded ----
-
-struct FieldCase
-{
-    const char* key;
-    std::function<ACE_WString(WorkshopInfoUpdater&)> get;
-    std::function<bool(WorkshopInfoUpdater&, const ACE_WString&)> set;
-};
-
-void PrintTo(const FieldCase& c, std::ostream* os)
-{
-    *os << c.key;
-}
-
-class WorkshopInfoUpdaterFields : public WorkshopInfoUpdaterTest, public ::testing::WithParamInterface<FieldCase>
-{
-};
-
-TEST_P(WorkshopInfoUpdaterFields, ReadsAndWritesItsOwnKey)
-{
-    const FieldCase& c = GetParam();
-    writeFile(str(c.key, "from file ü") + str("other", "o"));
-    WorkshopInfoUpdater store(w(path()));
-    ASSERT_TRUE(store.load());
-    EXPECT_EQ(u(c.get(store)), "from file ü");
-    EXPECT_TRUE(c.set(store, w("changed 漢字")));
-    ASSERT_TRUE(store.save());
-    const BSet saved = readBack(path());
-    EXPECT_EQ(stringAt(saved, c.key), "changed 漢字");
-    EXPECT_EQ(stringAt(saved, "other"), "o");
-    EXPECT_EQ(saved.size(), 2);
-    EXPECT_TRUE(m_log.messages(kError).empty());
-}
-
-#define FIELD(key, Get, Set)                                                                       \
-    FieldCase                                                                                      \
-    {                                                                                              \
-        key, [](WorkshopInfoUpdater& s) { return s.Get(); },                                       \
-            [](WorkshopInfoUpdater& s, const ACE_WString& v) { return s.Set(v); }                  \
-    }
-
-INSTANTIATE_TEST_SUITE_P(Keys, WorkshopInfoUpdaterFields,
-                         ::testing::Values(FIELD("numero_affaire", getBusinessNumber, setBusinessNumber),
-                                           FIELD("raison_sociale", getCorporateName, setCorporateName),
-                                           FIELD("nom", getName, setName), FIELD("rue", getRoad, setRoad),
-                                           FIELD("ville", getTown, setTown),
-                                           FIELD("codepostal", getPostalCode, setPostalCode),
-                                           FIELD("telephone", getTelephone, setTelephone),
-                                           FIELD("telecopie", getFax, setFax)),
-                         [](const auto& info) { return std::string(info.param.key); });
-
-TEST_F(WorkshopInfoUpdaterTest, SecondLoadKeepsEdits)
-{
-    writeFile(str("nom", "Avant"));
-    WorkshopInfoUpdater store(w(path()));
-    ASSERT_TRUE(store.load());
-    store.setName(w("Après"));
-    EXPECT_TRUE(store.load());
-    EXPECT_TRUE(m_log.contains("WorkshopInfoUpdater::load: file already loaded", kWarning));
-    EXPECT_EQ(u(store.getName()), "Après");
-}
-
-TEST_F(WorkshopInfoUpdaterTest, IdentityProviderInfosRoundTrip)
-{
-    writeFile(typed("Bool", "new_docuvia_mode", "true"));
-    WorkshopInfoUpdater store(w(path()));
-    ASSERT_TRUE(store.load());
+    std::string file = typed("Bool", "new_docuvia_mode", "true") + str("IDP_Infos", "not a set");
+    for (const auto& [key, name, get, set] : kFields)
+        file += str(key, key);
+    WorkshopInfoUpdater& store = loaded(file);
     EXPECT_TRUE(store.getNewDocuviaMode());
-
-    BSet infos(10);
+    BSet infos(10), given(10);
     EXPECT_FALSE(store.getMarvaneIDPInfos(infos));
-    EXPECT_TRUE(m_log.contains("WorkshopInfoUpdater::getMarvaneIDPInfosm_BSet.get('IDP_Infos') failed with error '" +
-                                   std::to_string(BSet::eNO_SUCH_KEY) + "')",
-                               kError));
-
-    BSet given(10);
-    given.setString(w("issuer"), w("https://idp.example"));
-    given.setInt(w("ttl"), 3600);
+    EXPECT_TRUE(m_log.containsSubstring("get('IDP_Infos') failed with error '2')", kError)); // wrong type
+    for (const auto& [key, name, get, set] : kFields)
+        if (std::string(key) != "default_brand") // a brand is looked up, see below
+            EXPECT_TRUE(utf8((store.*get)()) == key && (store.*set)(wide(std::string(name) + " 漢字"))) << key;
+    given.setInt(L"ttl"_w, 3600);
     EXPECT_TRUE(store.setMarvaneIDPInfos(given));
+    EXPECT_TRUE(store.load()); // a second load keeps the edits
+    EXPECT_TRUE(m_log.contains("WorkshopInfoUpdater::load: file already loaded", kWarning));
     ASSERT_TRUE(store.save());
-
-    WorkshopInfoUpdater reread(w(path()));
-    ASSERT_TRUE(reread.load());
-    BSet back(10);
-    ASSERT_TRUE(reread.getMarvaneIDPInfos(back));
-    EXPECT_TRUE(back.equals(given));
+    ASSERT_TRUE(reread().getMarvaneIDPInfos(infos));
+    EXPECT_TRUE(infos.equals(given));
+    const BSet saved = SettingsFiles::read(path());
+    for (const auto& [key, name, get, set] : kFields)
+        EXPECT_EQ(SettingsFiles::stringAt(saved, key), std::string(key) == "default_brand" ? key : std::string(name) + " 漢字");
 }
 
-TEST_F(WorkshopInfoUpdaterTest, IdentityProviderInfosOfWrongTypeIsAnError)
-{
-    writeFile(str("IDP_Infos", "not a set"));
-    WorkshopInfoUpdater store(w(path()));
-    ASSERT_TRUE(store.load());
-    BSet infos(10);
-    EXPECT_FALSE(store.getMarvaneIDPInfos(infos));
-    EXPECT_TRUE(m_log.containsSubstring("failed with error '" + std::to_string(BSet::eWRONG_TYPE) + "')", kError));
-}
-
-TEST_F(WorkshopInfoUpdaterTest, CopiesAreIndependent)
-{
-    writeFile(str("nom", "A"));
-    WorkshopInfoUpdater store(w(path()));
-    ASSERT_TRUE(store.load());
-    WorkshopInfoUpdater copy(store);
-    copy.setName(w("B"));
-    EXPECT_EQ(u(store.getName()), "A");
-    WorkshopInfoUpdater assigned(w(m_dir.file("x.xml")));
-    assigned = copy;
-    EXPECT_TRUE(assigned.isLoaded());
-    EXPECT_EQ(u(assigned.getName()), "B");
-}
-
-// ---- brands ----
-
-const wchar_t* const kBrandsUri = L"data:/Configuration/DoC/Config_Accueil/Brands";
-
-class WorkshopBrandTest : public ComponentFixture
+// The file keeps a brand's key; the dialog shows and picks its text from the text component.
+// Brands 10 and 20 have texts; 30 has none; "0" and "abc" are keys that are no numbers.
+class WorkshopBrandTest : public StoreFixture<WorkshopInfoUpdater, ComponentFixture>
 {
 protected:
-    void SetUp() override
-    {
-        ComponentFixture::SetUp();
-        TempDir::write(m_path, document(""));
-        m_store = std::make_unique<WorkshopInfoUpdater>(w(m_path));
-        ASSERT_TRUE(m_store->load());
-    }
-    void TearDown() override
-    {
-        m_store.reset();
-        ComponentFixture::TearDown();
-    }
-    // Brands 10 and 20 have texts; 30 has none; "0" and "abc" are keys that are no numbers.
     void publishBrands()
     {
         BSet brands(10);
-        brands.setString(w("10"), w("Alpha"));
-        brands.setString(w("20"), w("Beta"));
-        brands.setString(w("30"), w("Gamma"));
-        brands.setString(w("0"), w("Zero"));
-        brands.setString(w("abc"), w("Letters"));
-        ASSERT_EQ(m_dataManager->createData(ID(kBrandsUri), brands), 0);
-        m_text->setText(w("10"), w("Alpha Motors"));
-        m_text->setText(w("20"), w("Beta Automobiles"));
-        m_text->setText(w("0"), w("Zero Text"));
-    }
-    // A store loaded from a file whose "default_brand" is `key`.
-    void writeBrand(const std::string& key)
-    {
-        TempDir::write(m_path, document(str("default_brand", key)));
-        m_store = std::make_unique<WorkshopInfoUpdater>(w(m_path));
-        ASSERT_TRUE(m_store->load());
+        for (const char* key : {"10", "20", "30", "0", "abc"})
+            brands.setString(wide(key), wide(std::string("name ") + key));
+        ASSERT_EQ(m_dataManager->createData(ID(Uri::kBrands), brands), 0);
+        m_text->setText(L"10"_w, L"Alpha Motors"_w);
+        m_text->setText(L"20"_w, L"Beta Automobiles"_w);
+        m_text->setText(L"0"_w, L"Zero Text"_w);
     }
     std::string storedBrand()
     {
         EXPECT_TRUE(m_store->save());
-        return stringAt(readBack(m_path), "default_brand");
+        return SettingsFiles::stringAt(SettingsFiles::read(path()), "default_brand");
     }
-
-    TempDir m_dir;
-    std::string m_path = m_dir.file("InformationsGarage.xml");
-    std::unique_ptr<WorkshopInfoUpdater> m_store;
 };
 
-struct SetBrandCase
+// An untranslated brand matches under its table name, a translated one does not; with no table
+// the key stored is empty.
+TEST_F(WorkshopBrandTest, SetStoresTheKeyOfTheShownNameOrTheFirstKeyAndGetShowsItsText)
 {
-    const char* shown;
-    bool matched;
-    const char* stored;
-};
-
-void PrintTo(const SetBrandCase& c, std::ostream* os)
-{
-    *os << '"' << c.shown << '"';
-}
-
-class WorkshopSetBrand : public WorkshopBrandTest, public ::testing::WithParamInterface<SetBrandCase>
-{
-};
-
-TEST_P(WorkshopSetBrand, StoresTheKeyOfTheShownName)
-{
-    publishBrands();
-    const SetBrandCase& c = GetParam();
-    EXPECT_EQ(m_store->setDefaultBrand(w(c.shown)), c.matched) << c.shown;
-    EXPECT_EQ(storedBrand(), c.stored) << c.shown;
-}
-
-INSTANTIATE_TEST_SUITE_P(Names, WorkshopSetBrand,
-                         ::testing::Values(SetBrandCase{"Beta Automobiles", true, "20"},
-                                           SetBrandCase{"Alpha Motors", true, "10"},
-                                           // Untranslated brand: matched under its default name.
-                                           SetBrandCase{"Gamma", true, "30"},
-                                           // A translated brand is not matched by its default name.
-                                           SetBrandCase{"Beta", false, "10"},
-                                           SetBrandCase{"beta automobiles", false, "10"},
-                                           SetBrandCase{"", false, "10"}));
-
-struct GetBrandCase
-{
-    const char* stored;
-    const char* shown;
-};
-
-void PrintTo(const GetBrandCase& c, std::ostream* os)
-{
-    *os << '"' << c.stored << '"';
-}
-
-class WorkshopGetBrand : public WorkshopBrandTest, public ::testing::WithParamInterface<GetBrandCase>
-{
-};
-
-TEST_P(WorkshopGetBrand, ShowsTheTextOfTheStoredKey)
-{
-    publishBrands();
-    const GetBrandCase& c = GetParam();
-    writeBrand(c.stored);
-    EXPECT_EQ(u(m_store->getDefaultBrand()), c.shown) << c.stored;
-}
-
-INSTANTIATE_TEST_SUITE_P(Keys, WorkshopGetBrand,
-                         ::testing::Values(GetBrandCase{"20", "Beta Automobiles"}, GetBrandCase{"10", "Alpha Motors"},
-                                           // No text: the empty default, not the table's name.
-                                           GetBrandCase{"30", ""}, GetBrandCase{"99", ""},
-                                           GetBrandCase{"0", ""}, GetBrandCase{"abc", ""},
-                                           GetBrandCase{"20 ", ""}, GetBrandCase{"", ""}));
-
-TEST_F(WorkshopBrandTest, EmptyTableStoresEmptyKey)
-{
-    ASSERT_TRUE(m_store->setBusinessNumber(w("B-1")));
-    EXPECT_FALSE(m_store->setDefaultBrand(w("Alpha Motors")));
+    EXPECT_FALSE(loaded("").setDefaultBrand(L"Alpha Motors"_w));
     EXPECT_EQ(storedBrand(), "");
-    EXPECT_TRUE(readBack(m_path).contains(w("default_brand")));
+    publishBrands();
+    for (const auto& [shown, matched, stored] : {std::tuple("Beta Automobiles", true, "20"), std::tuple("name 30", true, "30"),
+                                                 std::tuple("name 20", false, "10")})
+    {
+        EXPECT_EQ(loaded("").setDefaultBrand(wide(shown)), matched) << shown;
+        EXPECT_EQ(storedBrand(), stored) << shown;
+    }
+    for (const auto& [stored, shown] : {std::pair("20", "Beta Automobiles"), std::pair("30", ""), std::pair("99", ""), std::pair("0", ""), std::pair("abc", ""), std::pair("", "")})
+        EXPECT_EQ(utf8(loaded(str("default_brand", stored)).getDefaultBrand()), shown) << stored;
 }
 
-TEST_F(WorkshopBrandTest, WithoutTextComponentNothingIsWritten)
+// Both components are needed: with one of them gone nothing is looked up or written.
+TEST_F(WorkshopBrandTest, WithoutTextComponentOrDataManagerNothingIsWritten)
 {
     publishBrands();
-    ASSERT_TRUE(m_store->setDefaultBrand(w("Beta Automobiles")));
+    loaded("");
+    ASSERT_TRUE(m_store->setDefaultBrand(L"Beta Automobiles"_w));
     destroyText();
-    EXPECT_FALSE(m_store->setDefaultBrand(w("Alpha Motors")));
-    EXPECT_EQ(u(m_store->getDefaultBrand()), "");
-    EXPECT_EQ(storedBrand(), "20");
-}
-
-TEST_F(WorkshopBrandTest, WithoutDataManagerNothingIsWritten)
-{
-    publishBrands();
-    ASSERT_TRUE(m_store->setDefaultBrand(w("Beta Automobiles")));
+    EXPECT_FALSE(m_store->setDefaultBrand(L"Alpha Motors"_w) || m_store->getDefaultBrand().length() != 0);
+    m_text = CBText::registerWith(*m_manager);
+    m_text->setText(L"10"_w, L"Alpha Motors"_w);
     destroyDataManager();
-    EXPECT_FALSE(m_store->setDefaultBrand(w("Alpha Motors")));
-    EXPECT_EQ(u(m_store->getDefaultBrand()), "");
+    EXPECT_FALSE(m_store->setDefaultBrand(L"Alpha Motors"_w) || m_store->getDefaultBrand().length() != 0);
     EXPECT_EQ(storedBrand(), "20");
 }
 }

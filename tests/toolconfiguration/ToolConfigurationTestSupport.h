@@ -2,20 +2,18 @@
 
 #include "ToolConfigurationCommand.h"
 
+#include "BBool.h"
 #include "BSet.h"
-#include "CComponent_Thread_NoRef.h"
-#include "ComponentFixture.h"
+#include "BString.h"
 #include "CustomEvent.h"
-#include "IComponentManager.h"
-#include "TempDir.h"
-#include "WideString.h"
+#include "DialogFixture.h"
+#include "UpdateUpdater.h"
+#include "UsersUpdater.h"
+#include "WorkshopInfoUpdater.h"
 
 #include <memory>
 #include <string>
-
-class WorkshopInfoUpdater;
-class UsersUpdater;
-class UpdateUpdater;
+#include <vector>
 
 // Reaches the controller's private state, which the dialog only sees through the data manager.
 class ToolConfigurationCommandTestAccess
@@ -24,37 +22,79 @@ public:
     static WorkshopInfoUpdater* workshop(ToolConfigurationCommand& c) { return c.m_pWorkshopInfoUpdater; }
     static UsersUpdater* users(ToolConfigurationCommand& c) { return c.m_pUsersUpdater; }
     static UpdateUpdater* update(ToolConfigurationCommand& c) { return c.m_pUpdateUpdater; }
-    static std::string app2AppIP(ToolConfigurationCommand& c) { return WideString::toUtf8(c.m_app2AppIP); }
-    static const BSet& app2AppValues(ToolConfigurationCommand& c) { return c.m_app2AppValues; }
+    static std::string app2AppIP(ToolConfigurationCommand& c) { return utf8(c.m_app2AppIP); }
+    static std::string app2AppValue(ToolConfigurationCommand& c, const char* key)
+    {
+        ACE_WString value(L"<missing>"_w);
+        c.m_app2AppValues.getString(wide(key), value);
+        return utf8(value);
+    }
     static bool recordingMode(ToolConfigurationCommand& c) { return c.m_bRecordingMode; }
-    static void setRecordingMode(ToolConfigurationCommand& c, bool on) { c.m_bRecordingMode = on; }
     static void createDMData(ToolConfigurationCommand& c, bool reset) { c.createDMData(reset); }
-    static void validateIP(ToolConfigurationCommand& c, ACE_WString& ip) { c.validateIP(ip); }
-    static void handleEvent(ToolConfigurationCommand& c, const CustomEvent& e) { c.handleEvent(e); }
-    static bool messageBoxAcquired(ToolConfigurationCommand& c) { return c.m_messageBoxManager.isAvailable(); }
-    static bool textAcquired(ToolConfigurationCommand& c) { return c.m_bText.isAvailable(); }
     static bool updateAgentAcquired(ToolConfigurationCommand& c) { return c.m_procStartUpdateAgent.isAvailable(); }
 };
 
-// A component that is registered but hands out no proxy: whoever asks for it gets nothing.
-class UnreachableComponent : public CComponent_Thread_NoRef
+// A controller over the dialog fixture's files, and readers of the records it publishes.
+class ToolConfigurationTest : public DialogFixture
 {
-public:
-    explicit UnreachableComponent(const ID& id) : CComponent_Thread_NoRef(id) {}
-
-    static int registerWith(IComponentManager& manager, const wchar_t* id)
+protected:
+    void TearDown() override
     {
-        return manager.registerComponent(std::make_unique<UnreachableComponent>(ID(id)),
-                                         [](IComponent*) -> ProxyComponent* { return nullptr; });
+        m_command.reset();
+        DialogFixture::TearDown();
     }
+
+    ToolConfigurationCommand& makeCommand()
+    {
+        m_command = std::make_unique<ToolConfigurationCommand>(QStringLiteral("WC_TOOLCONFIGURATION"));
+        return *m_command;
+    }
+    UpdateUpdater& update() { return *ToolConfigurationCommandTestAccess::update(*m_command); }
+
+    static ID control(const std::string& name) { return ID(wide("data:/Auto/SystemMenu/" + name)); }
+    bool has(const std::string& name) const
+    {
+        BSet set;
+        BString text;
+        BBool flag;
+        return m_dataManager->getData(control(name), set) == 0 || m_dataManager->getData(control(name), text) == 0 ||
+               m_dataManager->getData(control(name), flag) == 0;
+    }
+    BSet record(const std::string& name) const
+    {
+        BSet set;
+        EXPECT_EQ(m_dataManager->getData(control(name), set), 0) << name;
+        return set;
+    }
+    // A record as "state|text": the edit's item, the two edits, or the combo's selection.
+    std::string shown(const std::string& name) const
+    {
+        const BSet r = record(name);
+        long state = -1;
+        r.getInt(L"state"_w, state);
+        ACE_WString first, second;
+        if (r.getString(L"edit1"_w, first) == 0 && r.getString(L"edit2"_w, second) == 0)
+            return std::to_string(state) + "|" + utf8(first) + "|" + utf8(second);
+        if (r.getString(L"selected"_w, first) != 0)
+        {
+            BSet value;
+            r.getSet(L"value"_w, value);
+            value.getString(L"item"_w, first);
+        }
+        return std::to_string(state) + "|" + utf8(first);
+    }
+    bool flag(const std::string& name) const
+    {
+        bool value = false;
+        EXPECT_EQ(m_dataManager->getBool(control(name), value), 0) << name;
+        return value;
+    }
+    std::string text(const wchar_t* uri) const
+    {
+        ACE_WString value(L"<missing>"_w);
+        m_dataManager->getString(ID(uri), value);
+        return utf8(value);
+    }
+
+    std::unique_ptr<ToolConfigurationCommand> m_command;
 };
-
-inline ACE_WString wide(const std::string& utf8)
-{
-    return WideString::fromUtf8(utf8);
-}
-
-inline std::string utf8(const ACE_WString& text)
-{
-    return WideString::toUtf8(text);
-}

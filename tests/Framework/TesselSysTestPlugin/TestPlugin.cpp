@@ -6,42 +6,23 @@
 
 #include <atomic>
 
-namespace
-{
-std::atomic<int> s_componentsMade{0};
-std::atomic<int> s_proxiesMade{0};
-
-bool isCountedQuery(const ID& id)
-{
-    ACE_WString query;
-    return id.getQuery(query) && query == L"Counted";
-}
-}
-
 extern "C" {
+TESSEL_EXPORT std::atomic<int> testPluginComponentsMade{0};
+TESSEL_EXPORT std::atomic<int> testPluginProxiesMade{0};
+
 TESSEL_EXPORT IComponent* createComponent(const ID& id)
 {
-    if (!isCountedQuery(id))
+    ACE_WString query;
+    if (!id.getQuery(query) || query != L"Counted")
         return nullptr;
-    ++s_componentsMade;
+    ++testPluginComponentsMade;
     return new CComponent_Thread_NoRef(id);
 }
 
-TESSEL_EXPORT ProxyComponent* createProxy(const ID& id, IComponent* component)
+// Called only for components this library made.
+TESSEL_EXPORT ProxyComponent* createProxy(const ID&, IComponent* component)
 {
-    if (!isCountedQuery(id))
-        return nullptr;
-    ++s_proxiesMade;
+    ++testPluginProxiesMade;
     return new ProxyComponent(component);
-}
-
-TESSEL_EXPORT int testPluginComponentsMade()
-{
-    return s_componentsMade.load();
-}
-
-TESSEL_EXPORT int testPluginProxiesMade()
-{
-    return s_proxiesMade.load();
 }
 }

@@ -103,6 +103,20 @@ ACE_WString app2AppSharePath(const ACE_WString& address)
     return path;
 }
 
+// Asks for a folder. The answer is the one the dialog reports through its own signal, so whoever
+// answers the dialog (a person, or a test through fileSelected) is read the same way.
+QString chooseDirectory()
+{
+    QFileDialog dialog(nullptr, QStringLiteral("Choose a directory"), QStringLiteral("/home"));
+    dialog.setFileMode(QFileDialog::Directory);
+    dialog.setOption(QFileDialog::ShowDirsOnly);
+    QString chosen;
+    QObject::connect(&dialog, &QFileDialog::fileSelected, &dialog, [&chosen](const QString& path) { chosen = path; });
+    if (dialog.exec() != QDialog::Accepted)
+        return QString();
+    return chosen;
+}
+
 // The brand number right-justified to four characters with '0'; longer keys stay as they are.
 ACE_WString padBrandKey(const ACE_WString& key)
 {
@@ -807,8 +821,7 @@ void ToolConfigurationCommand::onCancelButtonClicked()
 void ToolConfigurationCommand::onFolderBrowserButtonClicked()
 {
     trace(L"[ToolConfigurationCommand::onFolderBrowserButtonClicked] : Method started");
-    const QString chosen = QFileDialog::getExistingDirectory(
-        nullptr, QStringLiteral("Choose a directory"), QStringLiteral("/home"), QFileDialog::ShowDirsOnly);
+    const QString chosen = chooseDirectory();
     if (m_pUpdateUpdater == nullptr || !m_dataManager.isAvailable())
         return;
     const ACE_WString path = toWide(chosen);
