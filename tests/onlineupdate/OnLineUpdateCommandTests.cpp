@@ -150,7 +150,7 @@ TEST_F(OnlineUpdateFixture, ParametersComeFromTheDataManager)
     EXPECT_TRUE(params.isValid());
     setConfig(Uri::kTaskTime, "7:30");
     EXPECT_FALSE(getScheduledTaskParamsFromDM().isValid());
-    EXPECT_TRUE(m_log.containsSubstring("- invalid setting", kError));
+    EXPECT_TRUE(m_log.containsSubstring("task time '7:30' is shorter than hh:mm", kError));
 }
 
 TEST_F(OnlineUpdateFixture, WithoutDataManagerNothingCanBeDone)
