@@ -11,9 +11,7 @@
 #include "TesselLog_Static.h"
 #include "ToolConfigurationCommand.h"
 
-#include <ace/OS_NS_unistd.h>
 #include <ace/Thread_Manager.h>
-#include <ace/Time_Value.h>
 
 #include <QApplication>
 #include <QEventLoop>
@@ -49,7 +47,7 @@ const wchar_t* const kTaskNameDefault = L"VEXAPreparerTask";
 
 const char* const kThreadName = "OnLineUpdateCommand::threadMethod_static";
 const unsigned long kThreadFailed = 666;
-const long kPollMicroseconds = 100000;
+const int kPollMilliseconds = 100;
 
 const int kFirstPreparerAnswer = IProcStartUpdateAgent::eOK;
 const int kLastPreparerAnswer = IProcStartUpdateAgent::eNOK_MISSING_UPDATE_AGENT;
@@ -376,7 +374,7 @@ bool OnLineUpdateCommand::startConfigurationTestWindow()
             if (future->ready())
                 loop.quit();
         });
-        poll.start(static_cast<int>(kPollMicroseconds / 1000));
+        poll.start(kPollMilliseconds);
         if (!future->ready())
             loop.exec();
     }

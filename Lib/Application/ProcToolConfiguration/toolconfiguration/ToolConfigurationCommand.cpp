@@ -22,7 +22,6 @@
 
 #include <QEvent>
 #include <QFileDialog>
-#include <QStringList>
 
 #include <algorithm>
 #include <memory>
