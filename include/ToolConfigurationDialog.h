@@ -19,7 +19,9 @@ class QButtonGroup;
 class QCheckBox;
 class QComboBox;
 class QGroupBox;
+class QLabel;
 class QLineEdit;
+class QListWidget;
 class QPushButton;
 class QRadioButton;
 class QTimeEdit;
@@ -53,8 +55,20 @@ public:
     // One line per group of settings, as the widgets show them.
     QStringList summary() const;
 
+    // Lists problems for the person in the window's problems area ("ProblemsList"), errors
+    // first, each with its icon; the area is hidden while there are none.
+    void showProblems(const QStringList& errors, const QStringList& warnings);
+
+    // The controls setFieldValue takes, each as "Name: what it takes", in the window's order.
+    QStringList fieldControls() const;
+
     // Esc and the window's close box act as Cancel.
     void reject() override;
+
+signals:
+    // A button (its object name; "CancelButton" also for Esc and the close box) is about to
+    // call its controller.
+    void aboutToAct(const QString& button);
 
 private:
     enum Kind
@@ -119,6 +133,8 @@ private:
     QButtonGroup* m_modeGroup;
     QPushButton* m_browseButton;
     QTreeWidget* m_usersList;
+    QLabel* m_problemsTitle;
+    QListWidget* m_problemsList;
     std::shared_ptr<ListenerGate> m_gate;
     int m_listenerHandle;
     // The data manager the listener was added to (observer: it may be gone at destruction).

@@ -7,6 +7,7 @@
 #include "CProcStartUpdateAgent.h"
 #include "CQ17FileSystemWatcher.h"
 #include "ComponentManagerFactory.h"
+#include "HostProblems.h"
 #include "ID.h"
 #include "PControllerFactoryBase.h"
 #include "SmartProxy.h"
@@ -57,7 +58,8 @@ ToolConfigurationHost::ToolConfigurationHost()
       m_mediator(nullptr),
       m_updateAgentStarter(nullptr),
       m_watcher(nullptr),
-      m_dialog(nullptr)
+      m_dialog(nullptr),
+      m_problems(std::make_unique<HostProblems>())
 {
 }
 
@@ -130,6 +132,10 @@ bool ToolConfigurationHost::start(const QString& dataFolder, const QString& conf
     m_previousTasksFolder = TaskSchedulerSettings::tasksFolder();
     TaskSchedulerSettings::setTasksFolder(tasksFolder.toStdString());
 
+    // Before the controllers: a changed file clears the list before they read it again.
+    if (!m_problems->start())
+        warning(QStringLiteral("cannot follow the log for the problems area"));
+
     m_factory = std::make_unique<SmartProxy<PControllerFactoryBase>>();
     if (!m_factory->acquire(ID(kFactoryID)))
         return fail(QStringLiteral("cannot load the plug-in %1").arg(QLatin1String(kFactoryID)));
@@ -143,7 +149,18 @@ bool ToolConfigurationHost::start(const QString& dataFolder, const QString& conf
         warning(QStringLiteral("WC_USERSCOMMAND: init failed"));
 
     m_dialog = m_mediator->createToolConfigurationDialog(m_toolConfiguration.get(), m_users.get());
-    return m_dialog != nullptr || fail(QStringLiteral("the mediator built no window"));
+    if (m_dialog == nullptr)
+        return fail(QStringLiteral("the mediator built no window"));
+    HostProblems* problems = m_problems.get();
+    ToolConfigurationDialog* dialog = m_dialog;
+    QObject::connect(dialog, &ToolConfigurationDialog::aboutToAct, problems, [problems](const QString& button) {
+        if (button == QLatin1String("OKButton") || button == QLatin1String("CancelButton"))
+            problems->beginAction();
+    });
+    auto show = [problems, dialog]() { dialog->showProblems(problems->texts(true), problems->texts(false)); };
+    QObject::connect(problems, &HostProblems::changed, dialog, show);
+    show();
+    return true;
 }
 
 void ToolConfigurationHost::stop()
@@ -154,6 +171,7 @@ void ToolConfigurationHost::stop()
     m_toolConfiguration.reset();
     m_factory.reset();
     m_dialog = nullptr;
+    m_problems->stop();
     if (m_manager != nullptr)
     {
         m_manager->destroyAllComponents();
@@ -196,6 +214,11 @@ CProcStartUpdateAgent* ToolConfigurationHost::updateAgentStarter() const
 CMediator* ToolConfigurationHost::mediator() const
 {
     return m_mediator;
+}
+
+const HostProblems& ToolConfigurationHost::problems() const
+{
+    return *m_problems;
 }
 
 QString ToolConfigurationHost::workingFolder() const

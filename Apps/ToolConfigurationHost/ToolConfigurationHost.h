@@ -6,6 +6,7 @@
 #include <string>
 
 class CDataManager;
+class HostProblems;
 class CMediator;
 class CMessageBoxManager;
 class CProcStartUpdateAgent;
@@ -41,6 +42,9 @@ public:
     CMessageBoxManager* messageBoxManager() const;
     CProcStartUpdateAgent* updateAgentStarter() const;
     CMediator* mediator() const;
+    // What the library has logged as warnings and errors since the last action; the window
+    // lists them too.
+    const HostProblems& problems() const;
     // The working folder, absolute.
     QString workingFolder() const;
     QString error() const;
@@ -64,6 +68,7 @@ private:
     std::unique_ptr<WidgetCommandBase> m_toolConfiguration;
     std::unique_ptr<WidgetCommandBase> m_users;
     ToolConfigurationDialog* m_dialog;
+    std::unique_ptr<HostProblems> m_problems;
     QString m_previousFolder;
     QString m_workingFolder;
     std::string m_previousTasksFolder;

@@ -1,6 +1,9 @@
 // The host application: shows the tool-configuration window over a working folder of settings.
 // Without a display it renders the window off screen, writes a screenshot and prints a summary.
 
+#include "HostHelp.h"
+#include "HostProblems.h"
+#include "TesselLog_Static.h"
 #include "ToolConfigurationDialog.h"
 #include "ToolConfigurationHost.h"
 
@@ -16,6 +19,15 @@
 
 namespace
 {
+// What the process answers; --help lists them.
+enum ExitCode
+{
+    eDONE = 0,
+    eNOT_SHOWN = 1,
+    eBAD_COMMAND_LINE = 2,
+    eSAVE_FAILED = 3
+};
+
 bool hasDisplay()
 {
     const QByteArray platform = qgetenv("QT_QPA_PLATFORM");
@@ -33,10 +45,22 @@ void printError(const QString& line)
 {
     std::fprintf(stderr, "ToolConfigurationHost: %s\n", line.toLocal8Bit().constData());
 }
+
+// Qt's own diagnostics go to the log file, not to the person's terminal.
+void logQtMessage(QtMsgType type, const QMessageLogContext&, const QString& message)
+{
+    if (type == QtFatalMsg)
+    {
+        std::fprintf(stderr, "ToolConfigurationHost: %s\n", message.toLocal8Bit().constData());
+        std::abort();
+    }
+    TesselLog_Static::logInformation_static("Qt", "Qt", "Qt", message.toStdWString().c_str());
+}
 }
 
 int main(int argc, char** argv)
 {
+    qInstallMessageHandler(logQtMessage);
     const bool display = hasDisplay();
     if (!display)
         qputenv("QT_QPA_PLATFORM", "offscreen");
@@ -44,8 +68,9 @@ int main(int argc, char** argv)
     QApplication::setApplicationName(QStringLiteral("ToolConfigurationHost"));
 
     QCommandLineParser parser;
-    parser.setApplicationDescription(QStringLiteral("Tool configuration: workshop, online update, App2App and users."));
-    parser.addHelpOption();
+    const QCommandLineOption helpOption({QStringLiteral("h"), QStringLiteral("help")}, QStringLiteral("Print the help."));
+    const QCommandLineOption listControlsOption(QStringLiteral("list-controls"),
+                                                QStringLiteral("Print the controls --set takes."));
     const QCommandLineOption dataOption(QStringLiteral("data"), QStringLiteral("Working folder with the settings (default: the current folder)."),
                                         QStringLiteral("DIR"), QDir::currentPath());
     const QCommandLineOption configOption(QStringLiteral("config"),
@@ -62,20 +87,36 @@ int main(int argc, char** argv)
     const QCommandLineOption pressOption(QStringLiteral("press"),
                                          QStringLiteral("Press ok or cancel after the changes, then exit."),
                                          QStringLiteral("ok|cancel"));
-    parser.addOptions({dataOption, configOption, languageOption, screenshotOption, setOption, pressOption});
-    parser.process(application);
+    parser.addOptions({helpOption, listControlsOption, dataOption, configOption, languageOption, screenshotOption,
+                       setOption, pressOption});
+    if (!parser.parse(QCoreApplication::arguments()))
+    {
+        printError(parser.errorText() + QStringLiteral(" (--help lists the options)"));
+        return eBAD_COMMAND_LINE;
+    }
+    if (parser.isSet(helpOption))
+    {
+        std::fputs(kHostHelp, stdout);
+        return eDONE;
+    }
+    if (!parser.positionalArguments().isEmpty())
+    {
+        printError(QStringLiteral("unexpected argument '%1' (--help lists the options)")
+                       .arg(parser.positionalArguments().first()));
+        return eBAD_COMMAND_LINE;
+    }
 
     const QString language = parser.value(languageOption);
     if (language != QLatin1String("en") && language != QLatin1String("fr"))
     {
         printError(QStringLiteral("unknown language '%1' (en or fr)").arg(language));
-        return 2;
+        return eBAD_COMMAND_LINE;
     }
     const QString press = parser.value(pressOption).toLower();
     if (!press.isEmpty() && press != QLatin1String("ok") && press != QLatin1String("cancel"))
     {
         printError(QStringLiteral("--press takes ok or cancel, not '%1'").arg(press));
-        return 2;
+        return eBAD_COMMAND_LINE;
     }
     // Relative paths on the command line are the caller's, not the working folder's.
     QString screenshot = parser.value(screenshotOption);
@@ -86,9 +127,15 @@ int main(int argc, char** argv)
     if (!host.start(parser.value(dataOption), parser.value(configOption), language))
     {
         printError(host.error());
-        return 1;
+        return eNOT_SHOWN;
     }
     ToolConfigurationDialog* dialog = host.dialog();
+    if (parser.isSet(listControlsOption))
+    {
+        for (const QString& control : dialog->fieldControls())
+            print(control);
+        return eDONE;
+    }
     dialog->show();
     QApplication::processEvents();
 
@@ -101,7 +148,7 @@ int main(int argc, char** argv)
         else if (dialog->setFieldValue(assignment.left(equals), assignment.mid(equals + 1), &error))
             continue;
         printError(error);
-        return 2;
+        return eBAD_COMMAND_LINE;
     }
     QApplication::processEvents();
 
@@ -112,29 +159,43 @@ int main(int argc, char** argv)
         if (!dialog->grab().save(screenshot, "PNG"))
         {
             printError(QStringLiteral("cannot write the screenshot '%1'").arg(screenshot));
-            return 1;
+            return eNOT_SHOWN;
         }
         print(QStringLiteral("Screenshot: %1").arg(screenshot));
     }
+    bool saveFailed = false;
     if (!press.isEmpty())
     {
         const bool ok = press == QLatin1String("ok");
         if (!dialog->clickButton(ok ? QStringLiteral("OKButton") : QStringLiteral("CancelButton")))
         {
             printError(QStringLiteral("the %1 button cannot be pressed").arg(press));
-            return 1;
+            return eNOT_SHOWN;
         }
         QApplication::processEvents();
         print(QStringLiteral("Pressed %1; the window is %2.")
                   .arg(ok ? QStringLiteral("OK") : QStringLiteral("Cancel"),
                        dialog->isVisible() ? QStringLiteral("still open") : QStringLiteral("closed")));
+        // Whatever OK logs as a warning or an error is a part of its work that was not done.
+        saveFailed = ok && !host.problems().problems().empty();
+        if (saveFailed)
+        {
+            printError(QStringLiteral("OK did not save everything:"));
+            for (const QString& line : host.problems().lines())
+                printError(QStringLiteral("  ") + line);
+        }
     }
     if (!display || !press.isEmpty())
     {
         print(QStringLiteral("Working folder: %1").arg(host.workingFolder()));
         for (const QString& line : dialog->summary())
             print(QStringLiteral("  ") + line);
-        return 0;
+        const QStringList problems = host.problems().lines();
+        if (!problems.isEmpty())
+            print(QStringLiteral("Problems:"));
+        for (const QString& line : problems)
+            print(QStringLiteral("  ") + line);
+        return saveFailed ? eSAVE_FAILED : eDONE;
     }
 
     QObject::connect(dialog, &QDialog::finished, &application, &QCoreApplication::quit);

@@ -1,4 +1,8 @@
 #include "CDataManager.h"
+#include "CQ17FileSystemWatcher.h"
+#include "BEvent.h"
+#include "CustomEvent.h"
+#include "HostProblems.h"
 #include "DialogDrivers.h"
 #include "LogCapture.h"
 #include "TesselLog_Static.h"
@@ -13,6 +17,7 @@
 #include <QComboBox>
 #include <QEventLoop>
 #include <QImage>
+#include <QListWidget>
 #include <QProcess>
 #include <QTreeWidget>
 
@@ -45,7 +50,7 @@ bool waitFor(const std::function<bool()>& done)
 }
 
 // Runs the host application on a copy of the demo data.
-int runHost(const QStringList& arguments, std::string* output = nullptr)
+int runHost(const QStringList& arguments, std::string* output = nullptr, std::string* errors = nullptr)
 {
     QProcess host;
     QProcessEnvironment environment = QProcessEnvironment::systemEnvironment();
@@ -56,7 +61,10 @@ int runHost(const QStringList& arguments, std::string* output = nullptr)
     EXPECT_TRUE(host.waitForFinished(60000));
     if (output != nullptr)
         *output = host.readAllStandardOutput().toStdString();
-    const bool explained = host.readAllStandardError().contains("ToolConfigurationHost: ");
+    const QByteArray errorOutput = host.readAllStandardError();
+    if (errors != nullptr)
+        *errors = errorOutput.toStdString();
+    const bool explained = errorOutput.contains("ToolConfigurationHost: ");
     EXPECT_TRUE(host.exitCode() == 0 || explained) << arguments.join(' ').toStdString();
     return host.exitCode();
 }
@@ -118,6 +126,21 @@ protected:
         record.setInt(L"state"_w, 3);
         record.setSet(L"value"_w, inner);
         m_host.dataManager()->setData(ID(wide(std::string("data:/Auto/SystemMenu/") + control)), record);
+    }
+
+    // What the problems area lists, one line per item; empty when the area is hidden.
+    std::string problemsShown() const
+    {
+        const auto* list = widget<QListWidget>("ProblemsList");
+        QStringList items;
+        for (int i = 0; list != nullptr && !list->isHidden() && i < list->count(); ++i)
+            items << list->item(i)->text();
+        return items.join('\n').toStdString();
+    }
+    // What the watcher tells the controllers when a settings file changes on disk.
+    static void announceChange(const char* file)
+    {
+        BEvent<CustomEvent>::broadcast(CustomEvent(CQ17FileSystemWatcher::eventType, wide(file)));
     }
 
     TempDir m_dir;
@@ -241,6 +264,27 @@ TEST_F(HostTest, FilesChangedOnDiskWhileTheWindowIsOpenShowUpInTheWidgets)
     EXPECT_TRUE(waitFor([this]() { return usersShown() == "Users (1): Alicia Moreau"; })) << usersShown();
 }
 
+TEST_F(HostTest, ProblemsAreListedInTheWindowUntilTheNextActionResolvesThem)
+{
+    EXPECT_EQ(problemsShown(), "");
+    const std::string workshop = TempDir::read(path(kWorkshopFile));
+    TempDir::write(path(kWorkshopFile), "<BSet><Str");
+    announceChange(kWorkshopFile);
+    EXPECT_NE(problemsShown().find(kWorkshopFile), std::string::npos) << "the unreadable file is named";
+    EXPECT_EQ(m_host.problems().problems().size(), 1u);
+
+    TempDir::write(path(kWorkshopFile), workshop);
+    announceChange(kWorkshopFile);
+    EXPECT_EQ(problemsShown(), "");
+    EXPECT_EQ(text("NameEdit"), "Harbour Lane Motors");
+
+    // A save that fails on OK is listed too.
+    std::filesystem::remove_all(path("User/OnLineUpdate"));
+    TempDir::write(path("User/OnLineUpdate"), "a file where the folder was");
+    ASSERT_TRUE(m_dialog->clickButton("OKButton"));
+    EXPECT_NE(problemsShown().find("Cannot save Preparateur data!"), std::string::npos) << problemsShown();
+}
+
 // Records reach the widgets through the event loop, also from another thread, without calling the
 // controller; typing does call it, and a change a person could not make is refused.
 TEST_F(HostTest, RecordsReachTheWidgetsOnTheGuiThreadAndOnlyTypingCallsTheController)
@@ -277,8 +321,22 @@ TEST(HostApplicationTest, RunsWithoutADisplayAndRefusesBadArguments)
     EXPECT_EQ(SettingsFiles::stringAt(SettingsFiles::read(dir.file(kWorkshopFile)), "nom"), "Scripted Name");
 
     EXPECT_GT(QImage(screenshot).width(), 600);
+
+    // A save that fails makes OK exit with its own code and say what failed.
+    std::filesystem::remove_all(dir.file("User/OnLineUpdate"));
+    TempDir::write(dir.file("User/OnLineUpdate"), "a file where the folder was");
+    std::string errors;
+    EXPECT_EQ(runHost({"--data", QString::fromStdString(dir.path().string()), "--press", "ok"}, &output, &errors), 3);
+    EXPECT_NE(errors.find("Cannot save Preparateur data!"), std::string::npos) << errors;
+
+    EXPECT_EQ(runHost({"--data", QString::fromStdString(dir.path().string()), "--list-controls"}, &output), 0);
+    EXPECT_NE(output.find("NameEdit: text\n"), std::string::npos) << output;
+    EXPECT_EQ(output.find("Country"), std::string::npos) << "display-only fields cannot be set";
+    EXPECT_EQ(runHost({"--help"}, &output), 0);
+    EXPECT_NE(output.find("Exit codes:"), std::string::npos);
     // Bad arguments and a missing data folder are refused.
-    EXPECT_EQ(runHost({"--press", "later"}), 2);
+    for (const QStringList& bad : {QStringList{"--press", "later"}, QStringList{"--no-such-option"}})
+        EXPECT_EQ(runHost(bad), 2) << bad.join(' ').toStdString();
     EXPECT_EQ(runHost({"--data", "/nonexistent/folder"}), 1);
 }
 }

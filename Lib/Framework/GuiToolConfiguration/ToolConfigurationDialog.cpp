@@ -24,6 +24,8 @@
 #include <QHeaderView>
 #include <QLabel>
 #include <QLineEdit>
+#include <QListWidget>
+#include <QStyle>
 #include <QMetaMethod>
 #include <QPushButton>
 #include <QRadioButton>
@@ -117,6 +119,8 @@ ToolConfigurationDialog::ToolConfigurationDialog(QObject* toolConfiguration, QOb
       m_modeGroup(nullptr),
       m_browseButton(nullptr),
       m_usersList(nullptr),
+      m_problemsTitle(nullptr),
+      m_problemsList(nullptr),
       m_gate(std::make_shared<ListenerGate>()),
       m_listenerHandle(0),
       m_listenedDataManager(nullptr)
@@ -173,10 +177,21 @@ void ToolConfigurationDialog::buildWindow()
     buttons->addWidget(addButton(QStringLiteral("CancelButton"), QStringLiteral("Cancel"), QStringLiteral("Cancel"),
                                  "onCancelButtonClicked()"));
 
+    m_problemsTitle = new QLabel(text(QStringLiteral("Problems"), QStringLiteral("Problems")), this);
+    m_problemsTitle->setObjectName(QStringLiteral("ProblemsTitle"));
+    m_problemsList = new QListWidget(this);
+    m_problemsList->setObjectName(QStringLiteral("ProblemsList"));
+    m_problemsList->setWordWrap(true);
+    m_problemsList->setMaximumHeight(90);
+    m_problemsTitle->hide();
+    m_problemsList->hide();
+
     auto* layout = new QVBoxLayout(this);
     layout->setContentsMargins(14, 14, 14, 12);
     layout->setSpacing(12);
     layout->addLayout(groups);
+    layout->addWidget(m_problemsTitle);
+    layout->addWidget(m_problemsList);
     layout->addLayout(buttons);
     setMinimumWidth(940);
 }
@@ -321,10 +336,9 @@ QGroupBox* ToolConfigurationDialog::buildApp2AppGroup()
     m_usersList->setUniformRowHeights(true);
     m_usersList->setAlternatingRowColors(true);
     m_usersList->setSelectionMode(QAbstractItemView::SingleSelection);
+    // Every column as wide as its contents; the list scrolls sideways when they do not fit.
     m_usersList->header()->setStretchLastSection(false);
-    m_usersList->header()->setSectionResizeMode(0, QHeaderView::ResizeToContents);
-    m_usersList->header()->setSectionResizeMode(1, QHeaderView::Stretch);
-    m_usersList->header()->setSectionResizeMode(2, QHeaderView::ResizeToContents);
+    m_usersList->header()->setSectionResizeMode(QHeaderView::ResizeToContents);
     m_usersList->setMinimumHeight(110);
 
     QPushButton* add = addButton(QStringLiteral("UsersAddButton"), QStringLiteral("UserAdd"), QStringLiteral("Add..."),
@@ -416,7 +430,10 @@ QPushButton* ToolConfigurationDialog::addButton(const QString& objectName, const
     button->setObjectName(objectName);
     button->setAutoDefault(false);
     if (slot != nullptr)
-        connect(button, &QPushButton::clicked, this, [this, slot]() { callTool(slot); });
+        connect(button, &QPushButton::clicked, this, [this, objectName, slot]() {
+            emit aboutToAct(objectName);
+            callTool(slot);
+        });
     return button;
 }
 
@@ -784,6 +801,9 @@ void ToolConfigurationDialog::reject()
         return;
     }
     QPointer<ToolConfigurationDialog> self(this);
+    emit aboutToAct(QStringLiteral("CancelButton"));
+    if (!self)
+        return;
     callTool("onCancelButtonClicked()");
     // The person asked to close the window: it goes even when no mediator closed it.
     if (self && isVisible())
@@ -901,4 +921,43 @@ QStringList ToolConfigurationDialog::summary() const
                  .arg(field("Country"), field("Language"), field("SerialNo"),
                       checked("ASRMChk") ? QStringLiteral("on") : QStringLiteral("off"));
     return lines;
+}
+
+void ToolConfigurationDialog::showProblems(const QStringList& errors, const QStringList& warnings)
+{
+    m_problemsList->clear();
+    const QIcon errorIcon = style()->standardIcon(QStyle::SP_MessageBoxCritical);
+    const QIcon warningIcon = style()->standardIcon(QStyle::SP_MessageBoxWarning);
+    for (const QString& error : errors)
+        new QListWidgetItem(errorIcon, error, m_problemsList);
+    for (const QString& warning : warnings)
+        new QListWidgetItem(warningIcon, warning, m_problemsList);
+    const bool any = m_problemsList->count() > 0;
+    m_problemsTitle->setVisible(any);
+    m_problemsList->setVisible(any);
+}
+
+QStringList ToolConfigurationDialog::fieldControls() const
+{
+    QStringList controls;
+    for (QWidget* widget : findChildren<QWidget*>())
+    {
+        const QString name = widget->objectName();
+        if (name.isEmpty() || name.startsWith(QLatin1String("qt_")))
+            continue;
+        QString takes;
+        if (const auto* edit = qobject_cast<const QLineEdit*>(widget))
+            takes = edit->isReadOnly() ? QString() : QStringLiteral("text");
+        else if (qobject_cast<const QRadioButton*>(widget) != nullptr)
+            takes = QStringLiteral("1 to choose it");
+        else if (qobject_cast<const QCheckBox*>(widget) != nullptr)
+            takes = QStringLiteral("1 or 0");
+        else if (qobject_cast<const QComboBox*>(widget) != nullptr)
+            takes = QStringLiteral("a label of the list");
+        else if (qobject_cast<const QTimeEdit*>(widget) != nullptr)
+            takes = QStringLiteral("a time HH:mm:ss");
+        if (!takes.isEmpty())
+            controls << QStringLiteral("%1: %2").arg(name, takes);
+    }
+    return controls;
 }
