@@ -49,8 +49,11 @@ public:
         bool exists = false, denied = false;
         if (op == kAvailable)
             return helper.checkTaskAvailableForCurrentUser(exists, denied) ? 1 + 2 * exists + 4 * denied : 0;
-        return op == kCreate ? helper.createScheduledTask(false)
-                             : op == kDelete ? helper.deleteScheduledTask(false) : helper.checkScheduledTask();
+        if (op == kCreate)
+            return helper.createScheduledTask(false);
+        if (op == kDelete)
+            return helper.deleteScheduledTask(false);
+        return helper.checkScheduledTask();
     }
 
     // Starting on 2024-03-14, every day or week.

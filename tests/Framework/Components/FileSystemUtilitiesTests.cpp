@@ -90,7 +90,9 @@ TEST(IniFile, ReadsTheFirstValueOfAKeyInItsSectionOfTheLastOpening)
         EXPECT_EQ(ini.readAttribute(L"S"_w, L"first"_w, value), s.first) << s.file;
         EXPECT_EQ(ini.readAttribute(L"B"_w, L"other"_w, value), s.other) << s.file;
         if (s.first == ok)
+        {
             EXPECT_EQ(utf8(value), "1");
+        }
     }
 }
 }
