@@ -136,6 +136,27 @@ TEST_F(ComponentManagerTest, ComponentOrProxyThatCannotBeMadeGivesCodeLogLineAnd
                                              "proxies=\"1\" references=\"1\"/>");
 }
 
+// An installed plug-in lies beside the framework: without it in the configured folder, the
+// manager looks in its own library's folder, then leaves the name to the loader.
+TEST_F(ComponentManagerTest, LibraryIsLookedForInTheConfiguredFolderThenBesideTheManager)
+{
+    const std::string elsewhere = ::testing::TempDir() + "ptc-no-plugins";
+    m_manager->setLibraryPath(elsewhere);
+    LogCapture log;
+    ProxyComponent* proxy = nullptr;
+    ASSERT_EQ(m_manager->getProxy(ID("test:NoSuchLibraryQx?Any"), proxy), IComponentManager::eLIBRARY_NOT_LOADED);
+    const std::vector<std::string> errors = log.messages(TesselLog_Static::eERROR);
+    ASSERT_EQ(errors.size(), 1u);
+    const std::string& tried = errors.front();
+    const size_t configured = tried.find(elsewhere + "/libNoSuchLibraryQx.so");
+    const size_t beside = tried.find(kBinFolder + "/libNoSuchLibraryQx.so");
+    const size_t bare = tried.find("; libNoSuchLibraryQx.so");
+    EXPECT_TRUE(configured < beside && beside < bare && bare != std::string::npos) << tried;
+
+    SmartProxy<ProxyComponent> plugin;
+    EXPECT_TRUE(plugin.acquire(ID(kPluginID)) && plugin->component() != nullptr);
+}
+
 // Threads racing to the first use make one component; the last proxy given back unloads the library.
 TEST_F(ComponentManagerTest, LibraryComponentIsMadeOnceAndUnloadedWithTheLastProxy)
 {
