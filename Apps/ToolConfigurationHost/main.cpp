@@ -2,6 +2,7 @@
 // Without a display it renders the window off screen, writes a screenshot and prints a summary.
 
 #include "ToolConfigurationDialog.h"
+#include "TaskSchedulerSettings.h"
 #include "ToolConfigurationHost.h"
 
 #include <QApplication>
@@ -62,8 +63,24 @@ int main(int argc, char** argv)
     const QCommandLineOption pressOption(QStringLiteral("press"),
                                          QStringLiteral("Press ok or cancel after the changes, then exit."),
                                          QStringLiteral("ok|cancel"));
-    parser.addOptions({dataOption, configOption, languageOption, screenshotOption, setOption, pressOption});
+    const QCommandLineOption schedulerOption(
+        QStringLiteral("scheduler"),
+        QStringLiteral("Who runs the daily task: cron (the default where crontab exists) or files (nobody)."),
+        QStringLiteral("files|cron"));
+    parser.addOptions({dataOption, configOption, languageOption, screenshotOption, setOption, pressOption,
+                       schedulerOption});
     parser.process(application);
+
+    const QString scheduler = parser.isSet(schedulerOption)
+                                  ? parser.value(schedulerOption)
+                                  : QLatin1String(TaskSchedulerSettings::crontabAvailable() ? "cron" : "files");
+    if (scheduler != QLatin1String("files") && scheduler != QLatin1String("cron"))
+    {
+        printError(QStringLiteral("--scheduler takes files or cron, not '%1'").arg(scheduler));
+        return 2;
+    }
+    TaskSchedulerSettings::setBackend(scheduler == QLatin1String("cron") ? TaskSchedulerSettings::eCron
+                                                                          : TaskSchedulerSettings::eFiles);
 
     const QString language = parser.value(languageOption);
     if (language != QLatin1String("en") && language != QLatin1String("fr"))
@@ -132,6 +149,7 @@ int main(int argc, char** argv)
     if (!display || !press.isEmpty())
     {
         print(QStringLiteral("Working folder: %1").arg(host.workingFolder()));
+        print(QStringLiteral("Scheduler: %1").arg(scheduler));
         for (const QString& line : dialog->summary())
             print(QStringLiteral("  ") + line);
         return 0;
