@@ -234,6 +234,9 @@ TEST_F(EndToEndTest, OkSchedulesTheAgentInCronAndItRuns)
     for (int i = 0; i < 100 && !CronTable::daemonRunning(); ++i)
         std::this_thread::sleep_for(std::chrono::milliseconds(50));
     ASSERT_TRUE(CronTable::daemonRunning());
+    // Cron sees a changed table by its folder's time in whole seconds: a change in the second of
+    // the last one (a previous test's) or of the daemon's reading would go unseen.
+    std::this_thread::sleep_for(std::chrono::milliseconds(1100));
 
     // The agent and its log folder, where the test user can run and write.
     const std::filesystem::path agent = m_dir.path() / "Agent" / "update-agent.sh";
