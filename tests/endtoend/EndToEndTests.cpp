@@ -45,6 +45,10 @@ protected:
         m_command.reset();
         m_factory.reset();
         ToolConfigurationTest::TearDown();
+        // The cron test's table and backend.
+        CronUser::setTable(TaskSchedulerSettings::cronUser(), std::string());
+        TaskSchedulerSettings::setBackend(TaskSchedulerSettings::eFiles);
+        TaskSchedulerSettings::setCronUser(std::string());
     }
 
     void openDialog()
@@ -192,32 +196,15 @@ private:
     pid_t m_pid = 0;
 };
 
-// The cron backend on the test user's crontab for the test's length.
-struct CronBackend
+// The task layer's lines in the table.
+size_t taskLines(const std::string& table, std::string* first = nullptr)
 {
-    explicit CronBackend(const std::string& user) : m_user(user)
-    {
-        TaskSchedulerSettings::setBackend(TaskSchedulerSettings::eCron);
-        TaskSchedulerSettings::setCronUser(user);
-    }
-    ~CronBackend()
-    {
-        CronUser::setTable(m_user, std::string());
-        TaskSchedulerSettings::setBackend(TaskSchedulerSettings::eFiles);
-        TaskSchedulerSettings::setCronUser(std::string());
-    }
-    std::string m_user;
-};
-
-// The lines of the table that belong to the task layer.
-std::vector<std::string> taskLines(const std::string& table)
-{
-    std::vector<std::string> lines;
     std::istringstream in(table);
+    size_t count = 0;
     for (std::string line; std::getline(in, line);)
-        if (line.find(CronTable::kMarker) != std::string::npos)
-            lines.push_back(line);
-    return lines;
+        if (line.find(CronTable::kMarker) != std::string::npos && count++ == 0 && first != nullptr)
+            *first = line;
+    return count;
 }
 }
 
@@ -229,7 +216,8 @@ TEST_F(EndToEndTest, OkSchedulesTheAgentInCronAndItRuns)
     const std::string user = CronUser::name(why);
     if (user.empty())
         GTEST_SKIP() << why;
-    const CronBackend backend(user);
+    TaskSchedulerSettings::setBackend(TaskSchedulerSettings::eCron);
+    TaskSchedulerSettings::setCronUser(user);
     const CronDaemon daemon;
     for (int i = 0; i < 100 && !CronTable::daemonRunning(); ++i)
         std::this_thread::sleep_for(std::chrono::milliseconds(50));
@@ -257,11 +245,11 @@ TEST_F(EndToEndTest, OkSchedulesTheAgentInCronAndItRuns)
     m_command->onCheckInternetChecked(true);
     m_command->onTaskTimeEditChanged(start);
     m_command->onOKButtonClicked();
-    const std::vector<std::string> lines = taskLines(CronUser::table(user));
-    ASSERT_EQ(lines.size(), 1u);
-    const std::string expected = std::to_string(start.minute()) + " " + std::to_string(start.hour()) + " * * * '" +
-                                 agent.string() + "' 'preparer'";
-    EXPECT_EQ(lines[0].substr(0, expected.size()), expected);
+    std::string line;
+    EXPECT_EQ(taskLines(CronUser::table(user), &line), 1u);
+    EXPECT_EQ(line.find(std::to_string(start.minute()) + " " + std::to_string(start.hour()) + " * * * '" +
+                        agent.string() + "' 'preparer'"),
+              0u) << line;
 
     const auto deadline = std::chrono::steady_clock::now() + std::chrono::seconds(90);
     while (!std::filesystem::exists(log) && std::chrono::steady_clock::now() < deadline)
@@ -271,6 +259,6 @@ TEST_F(EndToEndTest, OkSchedulesTheAgentInCronAndItRuns)
     openDialog();
     m_command->onCheckInternetChecked(false);
     m_command->onOKButtonClicked();
-    EXPECT_TRUE(taskLines(CronUser::table(user)).empty());
+    EXPECT_EQ(taskLines(CronUser::table(user)), 0u);
 }
 }
