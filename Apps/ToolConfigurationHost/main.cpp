@@ -1,8 +1,8 @@
 // The host application: shows the tool-configuration window over a working folder of settings.
 // Without a display it renders the window off screen, writes a screenshot and prints a summary.
 
-#include "ToolConfigurationDialog.h"
 #include "TaskSchedulerSettings.h"
+#include "ToolConfigurationDialog.h"
 #include "ToolConfigurationHost.h"
 
 #include <QApplication>
