@@ -131,6 +131,10 @@ bool ToolConfigurationHost::start(const QString& dataFolder, const QString& conf
     QDir().mkpath(tasksFolder);
     m_previousTasksFolder = TaskSchedulerSettings::tasksFolder();
     TaskSchedulerSettings::setTasksFolder(tasksFolder.toStdString());
+    TesselLog_Static::logInformation_static(kComponent, kFile, kClass,
+                                           TaskSchedulerSettings::backend() == TaskSchedulerSettings::eCron
+                                               ? L"task scheduler: cron (the tasks' lines in the crontab)"
+                                               : L"task scheduler: files (the tasks are not run)");
 
     // Before the controllers: a changed file clears the list before they read it again.
     if (!m_problems->start())

@@ -3,6 +3,7 @@
 
 #include "HostHelp.h"
 #include "HostProblems.h"
+#include "TaskSchedulerSettings.h"
 #include "TesselLog_Static.h"
 #include "ToolConfigurationDialog.h"
 #include "ToolConfigurationHost.h"
@@ -87,8 +88,12 @@ int main(int argc, char** argv)
     const QCommandLineOption pressOption(QStringLiteral("press"),
                                          QStringLiteral("Press ok or cancel after the changes, then exit."),
                                          QStringLiteral("ok|cancel"));
+    const QCommandLineOption schedulerOption(
+        QStringLiteral("scheduler"),
+        QStringLiteral("Who runs the daily task: cron (the default where crontab exists) or files (nobody)."),
+        QStringLiteral("files|cron"));
     parser.addOptions({helpOption, listControlsOption, dataOption, configOption, languageOption, screenshotOption,
-                       setOption, pressOption});
+                       setOption, pressOption, schedulerOption});
     if (!parser.parse(QCoreApplication::arguments()))
     {
         printError(parser.errorText() + QStringLiteral(" (--help lists the options)"));
@@ -105,6 +110,17 @@ int main(int argc, char** argv)
                        .arg(parser.positionalArguments().first()));
         return eBAD_COMMAND_LINE;
     }
+
+    const QString scheduler = parser.isSet(schedulerOption)
+                                  ? parser.value(schedulerOption)
+                                  : QLatin1String(TaskSchedulerSettings::crontabAvailable() ? "cron" : "files");
+    if (scheduler != QLatin1String("files") && scheduler != QLatin1String("cron"))
+    {
+        printError(QStringLiteral("--scheduler takes files or cron, not '%1'").arg(scheduler));
+        return eBAD_COMMAND_LINE;
+    }
+    TaskSchedulerSettings::setBackend(scheduler == QLatin1String("cron") ? TaskSchedulerSettings::eCron
+                                                                          : TaskSchedulerSettings::eFiles);
 
     const QString language = parser.value(languageOption);
     if (language != QLatin1String("en") && language != QLatin1String("fr"))
@@ -188,6 +204,7 @@ int main(int argc, char** argv)
     if (!display || !press.isEmpty())
     {
         print(QStringLiteral("Working folder: %1").arg(host.workingFolder()));
+        print(QStringLiteral("Scheduler: %1").arg(scheduler));
         for (const QString& line : dialog->summary())
             print(QStringLiteral("  ") + line);
         const QStringList problems = host.problems().lines();

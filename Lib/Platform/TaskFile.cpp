@@ -1,5 +1,6 @@
 #include "TaskFile.h"
 
+#include "CronTable.h"
 #include "EffectiveUser.h"
 #include "SettingsFile.h"
 #include "TaskSchedulerSettings.h"
@@ -277,6 +278,9 @@ HRESULT TaskFile::load(const std::wstring& name, TaskRecord& record)
         return result;
     if (parsed.owner != EffectiveUser::loginName())
         return E_ACCESSDENIED;
+    // A task cron would not run as recorded is disabled, so that it is saved again.
+    if (TaskSchedulerSettings::backend() == TaskSchedulerSettings::eCron && !CronTable::isScheduled(name, parsed))
+        parsed.flags |= TASK_FLAG_DISABLED;
     record = std::move(parsed);
     return S_OK;
 }
@@ -287,7 +291,15 @@ HRESULT TaskFile::save(const std::wstring& name, const TaskRecord& record)
         return E_INVALIDARG;
     TaskRecord saved = record;
     saved.owner = EffectiveUser::loginName();
-    return writeAtomically(pathOf(name), serialise(saved));
+    const std::string path = pathOf(name);
+    const std::string content = serialise(saved);
+    if (TaskSchedulerSettings::backend() != TaskSchedulerSettings::eCron)
+        return writeAtomically(path, content);
+    std::string line;
+    const HRESULT valid = CronTable::lineFor(name, saved, line);
+    if (FAILED(valid))
+        return valid;
+    return CronTable::apply(CronTable::userOf(saved), name, line, [&] { return writeAtomically(path, content); });
 }
 
 HRESULT TaskFile::remove(const std::wstring& name)
@@ -304,9 +316,12 @@ HRESULT TaskFile::remove(const std::wstring& name)
     if (FAILED(read) && (read != SCHED_E_UNKNOWN_OBJECT_VERSION || !regular))
         return read;
     TaskRecord parsed;
-    if (SUCCEEDED(read) && SUCCEEDED(parse(content, parsed)) && parsed.owner != EffectiveUser::loginName())
+    const bool wellFormed = SUCCEEDED(read) && SUCCEEDED(parse(content, parsed));
+    if (wellFormed && parsed.owner != EffectiveUser::loginName())
         return E_ACCESSDENIED;
-    if (::unlink(path.c_str()) != 0)
-        return fromErrno(errno);
-    return S_OK;
+    const auto unlinkFile = [&]() -> HRESULT { return ::unlink(path.c_str()) == 0 ? S_OK : fromErrno(errno); };
+    if (TaskSchedulerSettings::backend() != TaskSchedulerSettings::eCron)
+        return unlinkFile();
+    // A damaged file names no account: its line is looked for where a new task's would be.
+    return CronTable::apply(CronTable::userOf(wellFormed ? parsed : TaskRecord()), name, std::string(), unlinkFile);
 }

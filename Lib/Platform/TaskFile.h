@@ -16,11 +16,14 @@ public:
 
     // S_OK with the record; 0x80070002 when there is no such task, E_ACCESSDENIED when the
     // file cannot be read or belongs to another user, SCHED_E_UNKNOWN_OBJECT_VERSION when it
-    // is damaged.
+    // is damaged. With the cron backend, a task whose crontab line is missing or differs reads
+    // as disabled.
     static HRESULT load(const std::wstring& name, TaskRecord& record);
     // Writes the record with the effective user as owner: temporary file, fsync, rename.
-    // On failure the old file stays as it was.
+    // On failure the old file stays as it was. With the cron backend the task's crontab line is
+    // set in the same step: when either write fails, both stay as they were.
     static HRESULT save(const std::wstring& name, const TaskRecord& record);
-    // 0x80070002 when absent, E_ACCESSDENIED for another user's task.
+    // 0x80070002 when absent, E_ACCESSDENIED for another user's task. With the cron backend the
+    // task's crontab line goes in the same step.
     static HRESULT remove(const std::wstring& name);
 };

@@ -1,10 +1,12 @@
 #include "TaskSchedulerSettings.h"
 
+#include "CronTable.h"
 #include "Win32Service.h"
 
 #include <pwd.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <cstdlib>
 #include <filesystem>
 #include <mutex>
@@ -16,6 +18,9 @@ struct Settings
     std::mutex mutex;
     std::string tasksFolder;
     DWORD serviceState = 0;
+    TaskSchedulerSettings::Backend backend = TaskSchedulerSettings::eFiles;
+    std::string crontabCommand;
+    std::string cronUser;
 };
 
 Settings& settings()
@@ -79,7 +84,9 @@ DWORD TaskSchedulerSettings::serviceState()
         if (s.serviceState != 0)
             return s.serviceState;
     }
-    return tasksFolderUsable() ? SERVICE_RUNNING : SERVICE_STOPPED;
+    if (!tasksFolderUsable())
+        return SERVICE_STOPPED;
+    return backend() != eCron || CronTable::daemonRunning() ? SERVICE_RUNNING : SERVICE_STOPPED;
 }
 
 bool TaskSchedulerSettings::tasksFolderUsable()
@@ -90,4 +97,65 @@ bool TaskSchedulerSettings::tasksFolderUsable()
     if (!std::filesystem::is_directory(folder, error))
         return false;
     return access(folder.c_str(), W_OK | X_OK) == 0;
+}
+
+void TaskSchedulerSettings::setBackend(Backend backend)
+{
+    Settings& s = settings();
+    std::lock_guard<std::mutex> lock(s.mutex);
+    s.backend = backend;
+}
+
+TaskSchedulerSettings::Backend TaskSchedulerSettings::backend()
+{
+    Settings& s = settings();
+    std::lock_guard<std::mutex> lock(s.mutex);
+    return s.backend;
+}
+
+void TaskSchedulerSettings::setCrontabCommand(const std::string& command)
+{
+    Settings& s = settings();
+    std::lock_guard<std::mutex> lock(s.mutex);
+    s.crontabCommand = command;
+}
+
+std::string TaskSchedulerSettings::crontabCommand()
+{
+    Settings& s = settings();
+    std::lock_guard<std::mutex> lock(s.mutex);
+    return s.crontabCommand.empty() ? std::string("crontab") : s.crontabCommand;
+}
+
+void TaskSchedulerSettings::setCronUser(const std::string& user)
+{
+    Settings& s = settings();
+    std::lock_guard<std::mutex> lock(s.mutex);
+    s.cronUser = user;
+}
+
+std::string TaskSchedulerSettings::cronUser()
+{
+    Settings& s = settings();
+    std::lock_guard<std::mutex> lock(s.mutex);
+    return s.cronUser;
+}
+
+bool TaskSchedulerSettings::crontabAvailable()
+{
+    const std::string command = crontabCommand();
+    if (command.find('/') != std::string::npos)
+        return access(command.c_str(), X_OK) == 0;
+    const char* path = std::getenv("PATH");
+    std::string folders = path != nullptr ? path : "/usr/bin:/bin";
+    size_t start = 0;
+    while (start <= folders.size())
+    {
+        const size_t end = std::min(folders.find(':', start), folders.size());
+        const std::string folder = end > start ? folders.substr(start, end - start) : std::string(".");
+        if (access((folder + "/" + command).c_str(), X_OK) == 0)
+            return true;
+        start = end + 1;
+    }
+    return false;
 }

@@ -57,7 +57,9 @@ int runHost(const QStringList& arguments, std::string* output = nullptr, std::st
     for (const char* name : {"DISPLAY", "WAYLAND_DISPLAY", "QT_QPA_PLATFORM"})
         environment.remove(QString::fromLatin1(name));
     host.setProcessEnvironment(environment);
-    host.start(QCoreApplication::applicationDirPath() + "/ToolConfigurationHost", arguments);
+    // The tests' tasks stay in files: no test writes the user's crontab.
+    host.start(QCoreApplication::applicationDirPath() + "/ToolConfigurationHost",
+               QStringList{QStringLiteral("--scheduler"), QStringLiteral("files")} + arguments);
     EXPECT_TRUE(host.waitForFinished(60000));
     if (output != nullptr)
         *output = host.readAllStandardOutput().toStdString();

@@ -1,4 +1,6 @@
 #include "CScheduledTaskHelper.h"
+#include "CronTable.h"
+#include "CronUser.h"
 #include "DialogDrivers.h"
 #include "PControllerFactoryBase.h"
 #include "QListViewItem.h"
@@ -11,9 +13,22 @@
 
 #include <QTime>
 
+#include <pwd.h>
+#include <signal.h>
+#include <sys/stat.h>
+#include <spawn.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include <chrono>
+#include <filesystem>
 #include <memory>
+#include <sstream>
 #include <string>
+#include <thread>
 #include <vector>
+
+extern char** environ;
 
 namespace
 {
@@ -30,6 +45,10 @@ protected:
         m_command.reset();
         m_factory.reset();
         ToolConfigurationTest::TearDown();
+        // The cron test's table and backend.
+        CronUser::setTable(TaskSchedulerSettings::cronUser(), std::string());
+        TaskSchedulerSettings::setBackend(TaskSchedulerSettings::eFiles);
+        TaskSchedulerSettings::setCronUser(std::string());
     }
 
     void openDialog()
@@ -146,5 +165,100 @@ TEST_F(EndToEndTest, EditsThenCancelLeaveTheFilesUnchangedAndShowThemAgain)
     UsersUpdater users(wide(m_usersPath));
     ASSERT_TRUE(users.load());
     EXPECT_EQ(utf8(users.getApp2AppIP() + L" "_w + users.getApp2AppDealerID()), "10.0.0.7 D77");
+}
+
+namespace
+{
+// A cron daemon of the test's own when none runs; only that one is stopped, by its pid.
+class CronDaemon
+{
+public:
+    CronDaemon()
+    {
+        if (CronTable::daemonRunning())
+            return;
+        char* argv[] = {const_cast<char*>("cron"), const_cast<char*>("-f"), nullptr};
+        if (posix_spawnp(&m_pid, "cron", nullptr, nullptr, argv, environ) != 0)
+            m_pid = 0;
+    }
+    ~CronDaemon()
+    {
+        if (m_pid <= 0)
+            return;
+        ::kill(m_pid, SIGTERM);
+        int status = 0;
+        ::waitpid(m_pid, &status, 0);
+    }
+    CronDaemon(const CronDaemon&) = delete;
+    CronDaemon& operator=(const CronDaemon&) = delete;
+
+private:
+    pid_t m_pid = 0;
+};
+
+// The task layer's lines in the table.
+size_t taskLines(const std::string& table, std::string* first = nullptr)
+{
+    std::istringstream in(table);
+    size_t count = 0;
+    for (std::string line; std::getline(in, line);)
+        if (line.find(CronTable::kMarker) != std::string::npos && count++ == 0 && first != nullptr)
+            *first = line;
+    return count;
+}
+}
+
+// OK with online updates on schedules the demo agent in cron, which runs it at that minute; OK
+// with updates off takes the line out again. The one test that waits: for the agent's log, 90 s.
+TEST_F(EndToEndTest, OkSchedulesTheAgentInCronAndItRuns)
+{
+    std::string why;
+    const std::string user = CronUser::name(why);
+    if (user.empty())
+        GTEST_SKIP() << why;
+    TaskSchedulerSettings::setBackend(TaskSchedulerSettings::eCron);
+    TaskSchedulerSettings::setCronUser(user);
+    const CronDaemon daemon;
+    for (int i = 0; i < 100 && !CronTable::daemonRunning(); ++i)
+        std::this_thread::sleep_for(std::chrono::milliseconds(50));
+    ASSERT_TRUE(CronTable::daemonRunning());
+    // Cron sees a changed table by its folder's time in whole seconds: a change in the second of
+    // the last one (a previous test's) or of the daemon's reading would go unseen.
+    std::this_thread::sleep_for(std::chrono::milliseconds(1100));
+
+    // The agent and its log folder, where the test user can run and write.
+    const std::filesystem::path agent = m_dir.path() / "Agent" / "update-agent.sh";
+    const std::filesystem::path log = m_dir.path() / "Logs" / "update-agent.log";
+    std::filesystem::create_directories(agent.parent_path());
+    std::filesystem::create_directories(log.parent_path());
+    std::filesystem::copy_file(PTC_DEMO_DIR "/Agent/update-agent.sh", agent);
+    const passwd* entry = getpwnam(user.c_str());
+    ASSERT_NE(entry, nullptr);
+    ASSERT_EQ(::chmod(m_dir.path().c_str(), 0755), 0);
+    ASSERT_EQ(::chown(log.parent_path().c_str(), entry->pw_uid, entry->pw_gid), 0);
+    setConfig(Uri::kExecutablePath, agent.string());
+
+    // The next minute, or the one after when this one is nearly over.
+    const QTime now = QTime::currentTime();
+    const QTime start = QTime(now.hour(), now.minute()).addSecs(now.second() < 50 ? 60 : 120);
+    openDialog();
+    m_command->onCheckInternetChecked(true);
+    m_command->onTaskTimeEditChanged(start);
+    m_command->onOKButtonClicked();
+    std::string line;
+    EXPECT_EQ(taskLines(CronUser::table(user), &line), 1u);
+    EXPECT_EQ(line.find(std::to_string(start.minute()) + " " + std::to_string(start.hour()) + " * * * '" +
+                        agent.string() + "' 'preparer'"),
+              0u) << line;
+
+    const auto deadline = std::chrono::steady_clock::now() + std::chrono::seconds(90);
+    while (!std::filesystem::exists(log) && std::chrono::steady_clock::now() < deadline)
+        std::this_thread::sleep_for(std::chrono::milliseconds(500));
+    EXPECT_NE(TempDir::read(log.string()).find("preparer ran"), std::string::npos) << "no run of the agent in 90 s";
+
+    openDialog();
+    m_command->onCheckInternetChecked(false);
+    m_command->onOKButtonClicked();
+    EXPECT_EQ(taskLines(CronUser::table(user)), 0u);
 }
 }
