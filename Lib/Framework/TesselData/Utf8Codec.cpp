@@ -88,6 +88,14 @@ std::size_t Utf8Codec::decodeInto(const char* data, std::size_t size, wchar_t* o
     wchar_t* written = out;
     while (p < end)
     {
+        if (end - p >= 8 && asciiWord(p))
+        {
+            for (int i = 0; i < 8; ++i)
+                written[i] = static_cast<wchar_t>(p[i]);
+            p += 8;
+            written += 8;
+            continue;
+        }
         const auto lead = static_cast<unsigned char>(*p);
         if (lead < 0x80)
         {

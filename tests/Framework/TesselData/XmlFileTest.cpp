@@ -8,6 +8,7 @@
 
 #include <cmath>
 #include <limits>
+#include <string>
 
 namespace
 {
@@ -35,6 +36,13 @@ TEST(XmlFile, RoundTripKeepsOrderTypesAndEveryValue)
     TempDir dir;
     const std::string path = dir.file("settings.xml");
     ASSERT_TRUE(sampleSet().save(wide(path), false));
+    // The escapes as written: markup and control characters in text, also tabs and line breaks
+    // and quotes in keys.
+    const std::string written = TempDir::read(path);
+    for (const char* part : {"<String key=\"lines\">one\ntwo\r\nthree\r</String>",
+                             "<String key=\"markup\">&lt;a href=\"x\"&gt;&amp;amp; 'q'&lt;/a&gt; ]]&gt; &#01;&#31;\x7f</String>",
+                             "<String key=\"k\xC3\xA9y &lt;&amp;> &quot;q&quot; &#09;&#10;\"/>", "<Set key=\"empty\"/>"})
+        EXPECT_NE(written.find(part), std::string::npos) << part;
     BSet loaded;
     loaded.setInt(L"stale"_w, 1); // a load replaces the whole content
     ASSERT_TRUE(loaded.load(wide(path)));
