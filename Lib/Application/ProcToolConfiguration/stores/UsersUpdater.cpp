@@ -4,6 +4,10 @@
 #include "StringUtilities.h"
 #include "TesselLog_Static.h"
 
+#include <algorithm>
+#include <cwchar>
+#include <iterator>
+
 
 namespace
 {
@@ -47,9 +51,13 @@ void warn(const wchar_t* prefix, const wchar_t* text)
 
 void traceStarted(const wchar_t* prefix)
 {
-    ACE_WString message(prefix);
-    message += L": Method started.";
-    trace(message.c_str());
+    // Built on the stack: the prefixes are short literals of this file.
+    static const wchar_t kStarted[] = L": Method started.";
+    wchar_t message[256];
+    const std::size_t length = std::min(std::wcslen(prefix), std::size(message) - std::size(kStarted));
+    std::wmemcpy(message, prefix, length);
+    std::wmemcpy(message + length, kStarted, std::size(kStarted));
+    trace(message);
 }
 
 // The operations' common entry: trace, then whether the store may be used.
