@@ -83,6 +83,8 @@ private:
     struct Entry
     {
         Entry(const ACE_WString& key, std::unique_ptr<BData> value);
+        // An entry with an empty key.
+        explicit Entry(std::unique_ptr<BData> value);
         Entry(Entry&& other) noexcept;
         Entry& operator=(Entry&& other) noexcept;
 

@@ -59,6 +59,8 @@ BSet::BSet(int sizeHint)
 
 BSet::Entry::Entry(const ACE_WString& key, std::unique_ptr<BData> value) : key(key), value(std::move(value)) {}
 
+BSet::Entry::Entry(std::unique_ptr<BData> value) : value(std::move(value)) {}
+
 BSet::Entry::Entry(Entry&& other) noexcept : value(std::move(other.value))
 {
     key.swap(other.key);
@@ -371,7 +373,7 @@ int BSet::lookUp(const wchar_t* key, std::size_t length, std::size_t& hash) cons
 
 void BSet::append(ACE_WString& key, std::unique_ptr<BData> value, std::size_t hash)
 {
-    m_entries.emplace_back(ACE_WString(), std::move(value));
+    m_entries.emplace_back(std::move(value));
     m_entries.back().key.swap(key);
     if (m_index.empty())
     {

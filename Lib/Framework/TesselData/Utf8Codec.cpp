@@ -12,6 +12,16 @@ bool asciiWord(const char* p)
     std::memcpy(&word, p, sizeof word);
     return (word & 0x8080808080808080ULL) == 0;
 }
+
+// A well-formed two-byte sequence at `p` (the common non-ASCII case): its length, 0 otherwise.
+std::size_t twoByte(const char* p, const char* end, wchar_t& out)
+{
+    const auto lead = static_cast<unsigned char>(p[0]);
+    if (lead < 0xC2 || lead > 0xDF || end - p < 2 || (static_cast<unsigned char>(p[1]) & 0xC0) != 0x80)
+        return 0;
+    out = static_cast<wchar_t>(((lead & 0x1F) << 6) | (static_cast<unsigned char>(p[1]) & 0x3F));
+    return 2;
+}
 }
 
 std::size_t Utf8Codec::decodeOne(const char* p, const char* end, wchar_t& out)
@@ -103,7 +113,9 @@ std::size_t Utf8Codec::decodeInto(const char* data, std::size_t size, wchar_t* o
             ++p;
             continue;
         }
-        p += decodeOne(p, end, *written++);
+        const std::size_t two = twoByte(p, end, *written);
+        p += two != 0 ? two : decodeOne(p, end, *written);
+        ++written;
     }
     return static_cast<std::size_t>(written - out);
 }
@@ -172,6 +184,11 @@ std::size_t Utf8Codec::firstInvalid(const char* data, std::size_t size)
             continue;
         }
         wchar_t c = 0;
+        if (const std::size_t two = twoByte(p, end, c))
+        {
+            p += two;
+            continue;
+        }
         const std::size_t used = decodeOne(p, end, c);
         // U+FFFD itself is valid when it is written out in full.
         if (c == kReplacement && !(used == 3 && static_cast<unsigned char>(p[0]) == 0xEF &&

@@ -37,6 +37,24 @@ bool sameName(const char* name, const char* expected)
     return *name == *expected;
 }
 
+// The kind an element name stands for: a set, a scalar kind, or -1 for an unknown name.
+int kindOf(const char* name)
+{
+    switch (name[0])
+    {
+    case 'S':
+        return sameName(name, kSet) ? BData::eSET : sameName(name, kString) ? BData::eSTRING : -1;
+    case 'I':
+        return sameName(name, kInt) ? BData::eINT : -1;
+    case 'D':
+        return sameName(name, kDouble) ? BData::eDOUBLE : -1;
+    case 'B':
+        return sameName(name, kBool) ? BData::eBOOL : -1;
+    default:
+        return -1;
+    }
+}
+
 bool isXmlSpace(char c)
 {
     return c == ' ' || c == '\t' || c == '\n' || c == '\r';
@@ -230,7 +248,8 @@ bool parseNumber(const char* data, std::size_t size, T& value)
     return result.ec == std::errc() && result.ptr == last;
 }
 
-std::unique_ptr<BData> parseScalar(const pugi::xml_node& element, XmlSetCodec::Buffers& buffers, std::string& error)
+std::unique_ptr<BData> parseScalar(const pugi::xml_node& element, int kind, XmlSetCodec::Buffers& buffers,
+                                   std::string& error)
 {
     const char* name = element.name();
     const char* data = nullptr;
@@ -240,12 +259,12 @@ std::unique_ptr<BData> parseScalar(const pugi::xml_node& element, XmlSetCodec::B
         error = std::string("element <") + name + "> holds child elements";
         return nullptr;
     }
-    if (sameName(name, kString))
+    if (kind == BData::eSTRING)
     {
         const std::size_t length = decodeText(data, size, buffers);
         return std::make_unique<BString>(buffers.wide.data(), length);
     }
-    if (sameName(name, kInt))
+    if (kind == BData::eINT)
     {
         long value = 0;
         if (!parseNumber(data, size, value))
@@ -255,7 +274,7 @@ std::unique_ptr<BData> parseScalar(const pugi::xml_node& element, XmlSetCodec::B
         }
         return std::make_unique<BInt>(value);
     }
-    if (sameName(name, kDouble))
+    if (kind == BData::eDOUBLE)
     {
         double value = 0.0;
         if (!parseNumber(data, size, value))
@@ -265,7 +284,7 @@ std::unique_ptr<BData> parseScalar(const pugi::xml_node& element, XmlSetCodec::B
         }
         return std::make_unique<BDouble>(value);
     }
-    if (sameName(name, kBool))
+    if (kind == BData::eBOOL)
     {
         const char* first = data;
         const char* last = data + size;
@@ -487,7 +506,8 @@ bool XmlSetCodec::parseChildren(const pugi::xml_node& container, BSet& out, int 
         }
         ACE_WString key(buffers.wide.data(), keyLength);
         std::unique_ptr<BData> value;
-        if (sameName(child.name(), kSet))
+        const int kind = kindOf(child.name());
+        if (kind == BData::eSET)
         {
             auto nested = std::make_unique<BSet>();
             if (!parseChildren(child, *nested, depth + 1, buffers, error))
@@ -496,7 +516,7 @@ bool XmlSetCodec::parseChildren(const pugi::xml_node& container, BSet& out, int 
         }
         else
         {
-            value = parseScalar(child, buffers, error);
+            value = parseScalar(child, kind, buffers, error);
             if (!value)
                 return false;
         }
