@@ -69,8 +69,14 @@ bool enter(bool loaded, const wchar_t* prefix)
     return loaded;
 }
 
-// "user" followed by the slot number in decimal.
-ACE_WString slotKey(unsigned int slot)
+// One of this file's key literals as a key, without copying it.
+ACE_WString keyOf(const wchar_t* literal)
+{
+    return ACE_WString(literal, nullptr, false);
+}
+
+// "user" followed by the slot number in decimal, written into `text`; the key refers to it.
+ACE_WString slotKey(unsigned int slot, wchar_t (&text)[16])
 {
     wchar_t digits[12];
     std::size_t count = 0;
@@ -79,11 +85,11 @@ ACE_WString slotKey(unsigned int slot)
         digits[count++] = static_cast<wchar_t>(L'0' + slot % 10);
         slot /= 10;
     } while (slot != 0);
-    wchar_t text[16] = L"user";
+    std::wmemcpy(text, L"user", 4);
     std::size_t length = 4;
     while (count > 0)
         text[length++] = digits[--count];
-    return ACE_WString(text, length);
+    return ACE_WString(text, length, nullptr, false);
 }
 
 // The nested set under key, read in place; null when absent or not a set.
@@ -107,7 +113,8 @@ ACE_WString readSlotField(const BSet& content, unsigned int slot, const wchar_t*
     const BSet* users = nestedSet(content, kUsers);
     if (users == nullptr)
         return ACE_WString();
-    return readString(nestedSet(*users, slotKey(slot)), field);
+    wchar_t text[16];
+    return readString(nestedSet(*users, slotKey(slot, text)), field);
 }
 
 bool isUsedName(const ACE_WString& name)
@@ -118,14 +125,15 @@ bool isUsedName(const ACE_WString& name)
 // The number of consecutive used slots from slot `from` + 1 on, plus `from`.
 unsigned int countUsedSlots(const BSet& content, unsigned int from)
 {
-    const BSet* users = nestedSet(content, kUsers);
+    const BSet* users = nestedSet(content, keyOf(kUsers));
     unsigned int count = from;
     if (users == nullptr)
         return count;
-    const ACE_WString nameKey(kName);
+    const ACE_WString nameKey = keyOf(kName);
     while (count < kMaxUserCount)
     {
-        const BSet* slot = nestedSet(*users, slotKey(count + 1));
+        wchar_t text[16];
+        const BSet* slot = nestedSet(*users, slotKey(count + 1, text));
         const BData* name = slot != nullptr ? slot->find(nameKey) : nullptr;
         if (name == nullptr || name->type() != BData::eSTRING || !isUsedName(static_cast<const BString*>(name)->value()))
             break;
@@ -266,10 +274,11 @@ bool UsersUpdater::addUser(const ACE_WString& name, const ACE_WString& address, 
         warn(kAddUserPrefix, L": Max user count reached");
         return false;
     }
-    BSet& slot = m_content.editSet(kUsers).editSet(slotKey(count + 1));
-    slot.setString(kName, name);
-    slot.setString(kAddress, address);
-    slot.setString(kTelephone, phone);
+    wchar_t text[16];
+    BSet& slot = m_content.editSet(keyOf(kUsers)).editSet(slotKey(count + 1, text));
+    slot.setString(keyOf(kName), name);
+    slot.setString(keyOf(kAddress), address);
+    slot.setString(keyOf(kTelephone), phone);
     // Filling a gap joins the used slots after it.
     if (isUsedName(name))
         m_userCount = countUsedSlots(m_content, count + 1);
@@ -280,14 +289,18 @@ bool UsersUpdater::removeAllUsers()
 {
     if (!enter(m_loaded, L"[bool UsersUpdater::removeAllUsers()]"))
         return false;
-    BSet& users = m_content.editSet(kUsers);
+    BSet& users = m_content.editSet(keyOf(kUsers));
+    const ACE_WString nameKey = keyOf(kName);
+    const ACE_WString addressKey = keyOf(kAddress);
+    const ACE_WString telephoneKey = keyOf(kTelephone);
     const ACE_WString freeMark(kFreeSlot);
     for (unsigned int number = 1; number <= kMaxUserCount; ++number)
     {
-        BSet& slot = users.editSet(slotKey(number));
-        slot.setString(kName, freeMark);
-        slot.setString(kAddress, freeMark);
-        slot.setString(kTelephone, freeMark);
+        wchar_t text[16];
+        BSet& slot = users.editSet(slotKey(number, text));
+        slot.setString(nameKey, freeMark);
+        slot.setString(addressKey, freeMark);
+        slot.setString(telephoneKey, freeMark);
     }
     m_userCount = 0;
     return true;
@@ -306,8 +319,11 @@ bool UsersUpdater::doesUserExist(const ACE_WString& name)
     if (users == nullptr)
         return false;
     for (unsigned int slot = 1; slot <= kMaxUserCount; ++slot)
-        if (readString(nestedSet(*users, slotKey(slot)), kName) == name)
+    {
+        wchar_t text[16];
+        if (readString(nestedSet(*users, slotKey(slot, text)), kName) == name)
             return true;
+    }
     return false;
 }
 
