@@ -3,9 +3,9 @@
 #include "BData.h"
 #include "StringSet.h"
 
+#include <cstddef>
 #include <memory>
 #include <string>
-#include <unordered_map>
 #include <utility>
 #include <vector>
 
@@ -63,6 +63,11 @@ public:
     int setDouble(const ACE_WString& key, double value);
     int getSet(const ACE_WString& key, BSet& value) const;
     int setSet(const ACE_WString& key, const BSet& value);
+    // Moves `value` in under `key` without copying it; `value` is left empty. 0 on success.
+    int setSet(const ACE_WString& key, BSet&& value);
+    // The nested set under `key`, to be changed in place. A missing key or a value of another
+    // kind is first replaced, at its place, by an empty set.
+    BSet& editSet(const ACE_WString& key);
 
     // Ordered access, for walking a set without copying it. Out of range gives an empty key
     // and an empty string value.
@@ -70,11 +75,36 @@ public:
     const BData& valueAt(int index) const;
 
 private:
-    int indexOf(const ACE_WString& key) const;
+    friend class XmlSetCodec;
 
+    // Sets from this size on keep a hash index; smaller ones are searched in order.
+    static constexpr std::size_t kIndexFrom = 16;
+
+    struct Entry
+    {
+        Entry(const ACE_WString& key, std::unique_ptr<BData> value);
+        // An entry with an empty key.
+        explicit Entry(std::unique_ptr<BData> value);
+        Entry(Entry&& other) noexcept;
+        Entry& operator=(Entry&& other) noexcept;
+
+        ACE_WString key;
+        std::unique_ptr<BData> value;
+    };
+
+    static std::size_t hashKey(const wchar_t* key, std::size_t length);
+    int indexOf(const ACE_WString& key) const;
+    // Position of the key, or -1. `hash` is set when the set is indexed, for a following append.
+    int lookUp(const wchar_t* key, std::size_t length, std::size_t& hash) const;
+    // Appends a key known to be absent, taking its text (`key` is left empty); `hash` from lookUp.
+    void append(ACE_WString& key, std::unique_ptr<BData> value, std::size_t hash);
+    void insertIntoIndex(int position, std::size_t hash);
+    // Stores `value` as a `Kind` under `key`.
+    template <typename Kind, typename Value>
+    int writeTyped(const ACE_WString& key, const Value& value);
     void rebuildIndex();
 
-    std::vector<std::pair<ACE_WString, std::unique_ptr<BData>>> m_entries;
-    // Key -> position in m_entries, so lookups stay fast in large sets.
-    std::unordered_map<std::wstring, int> m_index;
+    std::vector<Entry> m_entries;
+    // Open-addressed table of positions in m_entries (-1 free), empty below kIndexFrom entries.
+    std::vector<int> m_index;
 };

@@ -2,12 +2,16 @@
 
 #include "BData.h"
 
+#include <cstddef>
+
 class TESSEL_EXPORT BString : public BData
 {
 public:
     BString();
     explicit BString(const ACE_WString& value);
     explicit BString(const wchar_t* value);
+    // The first `length` characters at `value`.
+    BString(const wchar_t* value, std::size_t length);
 
     Type type() const override;
     std::unique_ptr<BData> clone() const override;

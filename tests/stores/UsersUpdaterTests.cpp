@@ -55,7 +55,26 @@ TEST_F(UsersUpdaterTest, CountsConsecutiveUsedSlotsAndAddsAfterThem)
         EXPECT_EQ(store.getUserCount(), 1u) << gap;
         ASSERT_TRUE(store.addUser(L"Neu"_w, L"Rue 1"_w, L"0102"_w));
         EXPECT_EQ(utf8(store.getUserName(1) + store.getUserAddress(1) + store.getUserPhone(1) + store.getUserName(2)), "NeuRue 10102Carl");
+        EXPECT_EQ(store.getUserCount(), 3u) << gap; // the filled gap joins the used slot after it
     }
+}
+
+// Added one by one after removeAllUsers, users fill the slots in call order up to twenty; a
+// name "0" is written but leaves its slot free.
+TEST_F(UsersUpdaterTest, AddsUpToTwentyInCallOrder)
+{
+    UsersUpdater& store = loaded(users({"Old1", "Old2", "Old3"}));
+    ASSERT_TRUE(store.removeAllUsers());
+    ASSERT_TRUE(store.addUser(L"0"_w, L"a"_w, L"p"_w));
+    EXPECT_EQ(store.getUserCount(), 0u);
+    for (unsigned int n = 1; n <= 21; ++n)
+    {
+        EXPECT_EQ(store.addUser(wide("u" + std::to_string(n)), L"a"_w, L"p"_w), n <= 20) << n;
+        EXPECT_EQ(store.getUserCount(), n <= 20 ? n : 20u) << n;
+    }
+    EXPECT_EQ(utf8(store.getUserName(0) + store.getUserName(9) + store.getUserName(19)), "u1u10u20");
+    ASSERT_TRUE(store.save());
+    EXPECT_EQ(reread().getUserCount(), 20u);
 }
 
 // The limit is twenty users; doesUserExist looks at all twenty slots, matching exactly.

@@ -6,13 +6,37 @@
 #include "BString.h"
 
 #include <algorithm>
+#include <cwchar>
 
 namespace
 {
-std::wstring indexKey(const ACE_WString& key)
+bool sameKey(const ACE_WString& stored, const wchar_t* key, std::size_t length)
 {
-    return std::wstring(key.fast_rep(), key.length());
+    return stored.length() == length && std::wmemcmp(stored.fast_rep(), key, length) == 0;
 }
+
+template <typename Kind>
+struct KindOf;
+template <>
+struct KindOf<BString>
+{
+    static constexpr BData::Type type = BData::eSTRING;
+};
+template <>
+struct KindOf<BInt>
+{
+    static constexpr BData::Type type = BData::eINT;
+};
+template <>
+struct KindOf<BBool>
+{
+    static constexpr BData::Type type = BData::eBOOL;
+};
+template <>
+struct KindOf<BDouble>
+{
+    static constexpr BData::Type type = BData::eDOUBLE;
+};
 
 // Reads the value under `key` as a `Kind` into `value`; untouched on failure.
 template <typename Kind, typename Value>
@@ -21,7 +45,7 @@ int readTyped(const BSet& set, const ACE_WString& key, Value& value)
     const BData* found = set.find(key);
     if (found == nullptr)
         return BSet::eNO_SUCH_KEY;
-    if (found->type() != Kind().type())
+    if (found->type() != KindOf<Kind>::type)
         return BSet::eWRONG_TYPE;
     value = static_cast<const Kind*>(found)->value();
     return BSet::eOK;
@@ -33,12 +57,27 @@ BSet::BSet(int sizeHint)
     m_entries.reserve(static_cast<std::size_t>(std::clamp(sizeHint, 0, 1024)));
 }
 
-BSet::BSet(const BSet& other) : BData(other)
+BSet::Entry::Entry(const ACE_WString& key, std::unique_ptr<BData> value) : key(key), value(std::move(value)) {}
+
+BSet::Entry::Entry(std::unique_ptr<BData> value) : value(std::move(value)) {}
+
+BSet::Entry::Entry(Entry&& other) noexcept : value(std::move(other.value))
+{
+    key.swap(other.key);
+}
+
+BSet::Entry& BSet::Entry::operator=(Entry&& other) noexcept
+{
+    key.swap(other.key);
+    value = std::move(other.value);
+    return *this;
+}
+
+BSet::BSet(const BSet& other) : BData(other), m_index(other.m_index)
 {
     m_entries.reserve(other.m_entries.size());
     for (const auto& entry : other.m_entries)
-        m_entries.emplace_back(entry.first, entry.second->clone());
-    m_index = other.m_index;
+        m_entries.emplace_back(entry.key, entry.value->clone());
 }
 
 BSet& BSet::operator=(const BSet& other)
@@ -99,7 +138,7 @@ bool BSet::equals(const BData& other) const
         return false;
     for (std::size_t i = 0; i < m_entries.size(); ++i)
     {
-        if (!(m_entries[i].first == theirs[i].first) || !m_entries[i].second->equals(*theirs[i].second))
+        if (!(m_entries[i].key == theirs[i].key) || !m_entries[i].value->equals(*theirs[i].value))
             return false;
     }
     return true;
@@ -124,7 +163,7 @@ StringSet BSet::getAllKeys() const
 {
     StringSet keys;
     for (const auto& entry : m_entries)
-        keys.add(entry.first);
+        keys.add(entry.key);
     return keys;
 }
 
@@ -157,7 +196,7 @@ int BSet::get(const ACE_WString& key, BData& value) const
 const BData* BSet::find(const ACE_WString& key) const
 {
     const int index = indexOf(key);
-    return index < 0 ? nullptr : m_entries[static_cast<std::size_t>(index)].second.get();
+    return index < 0 ? nullptr : m_entries[static_cast<std::size_t>(index)].value.get();
 }
 
 int BSet::set(const ACE_WString& key, const BData& value)
@@ -170,14 +209,35 @@ int BSet::put(const ACE_WString& key, std::unique_ptr<BData> value)
 {
     if (!value)
         return eWRONG_TYPE;
-    const int index = indexOf(key);
+    std::size_t hash = 0;
+    const int index = lookUp(key.fast_rep(), key.length(), hash);
     if (index >= 0)
     {
-        m_entries[static_cast<std::size_t>(index)].second = std::move(value);
+        m_entries[static_cast<std::size_t>(index)].value = std::move(value);
         return eOK;
     }
-    m_entries.emplace_back(key, std::move(value));
-    m_index.emplace(indexKey(key), static_cast<int>(m_entries.size() - 1));
+    ACE_WString copy(key);
+    append(copy, std::move(value), hash);
+    return eOK;
+}
+
+template <typename Kind, typename Value>
+int BSet::writeTyped(const ACE_WString& key, const Value& value)
+{
+    std::size_t hash = 0;
+    const int index = lookUp(key.fast_rep(), key.length(), hash);
+    if (index < 0)
+    {
+        ACE_WString copy(key);
+        append(copy, std::make_unique<Kind>(value), hash);
+        return eOK;
+    }
+    std::unique_ptr<BData>& stored = m_entries[static_cast<std::size_t>(index)].value;
+    // A value of the same kind is overwritten in place, reusing its storage.
+    if (stored->type() == KindOf<Kind>::type)
+        static_cast<Kind&>(*stored).set(value);
+    else
+        stored = std::make_unique<Kind>(value);
     return eOK;
 }
 
@@ -188,7 +248,7 @@ int BSet::getString(const ACE_WString& key, ACE_WString& value) const
 
 int BSet::setString(const ACE_WString& key, const ACE_WString& value)
 {
-    return put(key, std::make_unique<BString>(value));
+    return writeTyped<BString>(key, value);
 }
 
 int BSet::getInt(const ACE_WString& key, long& value) const
@@ -198,7 +258,7 @@ int BSet::getInt(const ACE_WString& key, long& value) const
 
 int BSet::setInt(const ACE_WString& key, long value)
 {
-    return put(key, std::make_unique<BInt>(value));
+    return writeTyped<BInt>(key, value);
 }
 
 int BSet::getBool(const ACE_WString& key, bool& value) const
@@ -208,7 +268,7 @@ int BSet::getBool(const ACE_WString& key, bool& value) const
 
 int BSet::setBool(const ACE_WString& key, bool value)
 {
-    return put(key, std::make_unique<BBool>(value));
+    return writeTyped<BBool>(key, value);
 }
 
 int BSet::getDouble(const ACE_WString& key, double& value) const
@@ -218,7 +278,7 @@ int BSet::getDouble(const ACE_WString& key, double& value) const
 
 int BSet::setDouble(const ACE_WString& key, double value)
 {
-    return put(key, std::make_unique<BDouble>(value));
+    return writeTyped<BDouble>(key, value);
 }
 
 int BSet::getSet(const ACE_WString& key, BSet& value) const
@@ -231,12 +291,37 @@ int BSet::setSet(const ACE_WString& key, const BSet& value)
     return set(key, value);
 }
 
+int BSet::setSet(const ACE_WString& key, BSet&& value)
+{
+    auto moved = std::make_unique<BSet>(0);
+    *moved = std::move(value);
+    return put(key, std::move(moved));
+}
+
+BSet& BSet::editSet(const ACE_WString& key)
+{
+    std::size_t hash = 0;
+    const int index = lookUp(key.fast_rep(), key.length(), hash);
+    if (index >= 0)
+    {
+        std::unique_ptr<BData>& value = m_entries[static_cast<std::size_t>(index)].value;
+        if (value->type() != eSET)
+            value = std::make_unique<BSet>();
+        return static_cast<BSet&>(*value);
+    }
+    auto created = std::make_unique<BSet>();
+    BSet& result = *created;
+    ACE_WString copy(key);
+    append(copy, std::move(created), hash);
+    return result;
+}
+
 const ACE_WString& BSet::keyAt(int index) const
 {
     static const ACE_WString empty;
     if (index < 0 || static_cast<std::size_t>(index) >= m_entries.size())
         return empty;
-    return m_entries[static_cast<std::size_t>(index)].first;
+    return m_entries[static_cast<std::size_t>(index)].key;
 }
 
 const BData& BSet::valueAt(int index) const
@@ -244,18 +329,81 @@ const BData& BSet::valueAt(int index) const
     static const BString empty;
     if (index < 0 || static_cast<std::size_t>(index) >= m_entries.size())
         return empty;
-    return *m_entries[static_cast<std::size_t>(index)].second;
+    return *m_entries[static_cast<std::size_t>(index)].value;
+}
+
+std::size_t BSet::hashKey(const wchar_t* key, std::size_t length)
+{
+    // FNV-1a over the characters.
+    std::size_t hash = 14695981039346656037ULL;
+    for (std::size_t i = 0; i < length; ++i)
+    {
+        hash ^= static_cast<std::size_t>(key[i]);
+        hash *= 1099511628211ULL;
+    }
+    return hash;
 }
 
 int BSet::indexOf(const ACE_WString& key) const
 {
-    const auto it = m_index.find(indexKey(key));
-    return it == m_index.end() ? -1 : it->second;
+    std::size_t hash = 0;
+    return lookUp(key.fast_rep(), key.length(), hash);
+}
+
+int BSet::lookUp(const wchar_t* key, std::size_t length, std::size_t& hash) const
+{
+    if (m_index.empty())
+    {
+        for (std::size_t i = 0; i < m_entries.size(); ++i)
+            if (sameKey(m_entries[i].key, key, length))
+                return static_cast<int>(i);
+        return -1;
+    }
+    hash = hashKey(key, length);
+    const std::size_t mask = m_index.size() - 1;
+    for (std::size_t slot = hash & mask;; slot = (slot + 1) & mask)
+    {
+        const int position = m_index[slot];
+        if (position < 0)
+            return -1;
+        if (sameKey(m_entries[static_cast<std::size_t>(position)].key, key, length))
+            return position;
+    }
+}
+
+void BSet::append(ACE_WString& key, std::unique_ptr<BData> value, std::size_t hash)
+{
+    m_entries.emplace_back(std::move(value));
+    m_entries.back().key.swap(key);
+    if (m_index.empty())
+    {
+        if (m_entries.size() >= kIndexFrom)
+            rebuildIndex();
+    }
+    else if (m_entries.size() * 2 > m_index.size())
+        rebuildIndex();
+    else
+        insertIntoIndex(static_cast<int>(m_entries.size() - 1), hash);
+}
+
+void BSet::insertIntoIndex(int position, std::size_t hash)
+{
+    const std::size_t mask = m_index.size() - 1;
+    std::size_t slot = hash & mask;
+    while (m_index[slot] >= 0)
+        slot = (slot + 1) & mask;
+    m_index[slot] = position;
 }
 
 void BSet::rebuildIndex()
 {
     m_index.clear();
+    if (m_entries.size() < kIndexFrom)
+        return;
+    std::size_t slots = 2 * kIndexFrom;
+    while (slots < 4 * m_entries.size())
+        slots *= 2;
+    m_index.assign(slots, -1);
     for (std::size_t i = 0; i < m_entries.size(); ++i)
-        m_index.emplace(indexKey(m_entries[i].first), static_cast<int>(i));
+        insertIntoIndex(static_cast<int>(i), hashKey(m_entries[i].key.fast_rep(), m_entries[i].key.length()));
 }

@@ -108,17 +108,23 @@ std::string fileName(const std::string& path)
     return slash == std::string::npos ? path : path.substr(slash + 1);
 }
 
+// Whether `name` is `prefix` (a target's name and the infix) followed by the random suffix.
+bool isTemporaryName(const char* name, std::size_t length, const std::string& prefix)
+{
+    return length == prefix.size() + kTemporarySuffixLength && std::memcmp(name, prefix.data(), prefix.size()) == 0;
+}
+
 // Removes the temporaries of `path` that an interrupted save left in its folder.
 void removeStaleTemporaries(const std::string& path)
 {
     const std::string folder = parentFolder(path);
-    const std::string target = fileName(path);
+    const std::string prefix = fileName(path) + kTemporaryInfix;
     DIR* directory = ::opendir(folder.c_str());
     if (directory == nullptr)
         return;
     while (const dirent* entry = ::readdir(directory))
     {
-        if (SettingsFile::isTemporaryOf(entry->d_name, target))
+        if (isTemporaryName(entry->d_name, std::strlen(entry->d_name), prefix))
             ::unlinkat(::dirfd(directory), entry->d_name, 0);
     }
     ::closedir(directory);
@@ -134,8 +140,7 @@ std::string SettingsFile::nativePath(const std::string& path)
 
 bool SettingsFile::isTemporaryOf(const std::string& name, const std::string& target)
 {
-    const std::string prefix = target + kTemporaryInfix;
-    return name.size() == prefix.size() + kTemporarySuffixLength && name.compare(0, prefix.size(), prefix) == 0;
+    return isTemporaryName(name.data(), name.size(), target + kTemporaryInfix);
 }
 
 bool SettingsFile::read(const std::string& path, std::string& bytes, std::string& error, int& errorNumber)

@@ -1,6 +1,28 @@
 #include "Utf8Codec.h"
 
 #include <cstdint>
+#include <cstring>
+
+namespace
+{
+// Whether the 8 bytes at `p` are all ASCII.
+bool asciiWord(const char* p)
+{
+    std::uint64_t word = 0;
+    std::memcpy(&word, p, sizeof word);
+    return (word & 0x8080808080808080ULL) == 0;
+}
+
+// A well-formed two-byte sequence at `p` (the common non-ASCII case): its length, 0 otherwise.
+std::size_t twoByte(const char* p, const char* end, wchar_t& out)
+{
+    const auto lead = static_cast<unsigned char>(p[0]);
+    if (lead < 0xC2 || lead > 0xDF || end - p < 2 || (static_cast<unsigned char>(p[1]) & 0xC0) != 0x80)
+        return 0;
+    out = static_cast<wchar_t>(((lead & 0x1F) << 6) | (static_cast<unsigned char>(p[1]) & 0x3F));
+    return 2;
+}
+}
 
 std::size_t Utf8Codec::decodeOne(const char* p, const char* end, wchar_t& out)
 {
@@ -64,52 +86,85 @@ std::size_t Utf8Codec::decodeOne(const char* p, const char* end, wchar_t& out)
 
 void Utf8Codec::decode(const char* data, std::size_t size, std::wstring& out)
 {
-    out.reserve(out.size() + size);
-    const char* end = data + size;
+    const std::size_t old = out.size();
+    out.resize(old + size);
+    out.resize(old + decodeInto(data, size, &out[old]));
+}
+
+std::size_t Utf8Codec::decodeInto(const char* data, std::size_t size, wchar_t* out)
+{
+    const char* const end = data + size;
     const char* p = data;
-    wchar_t c = 0;
+    wchar_t* written = out;
     while (p < end)
     {
-        const std::size_t used = decodeOne(p, end, c);
-        out.push_back(c);
-        p += used;
+        if (end - p >= 8 && asciiWord(p))
+        {
+            for (int i = 0; i < 8; ++i)
+                written[i] = static_cast<wchar_t>(p[i]);
+            p += 8;
+            written += 8;
+            continue;
+        }
+        const auto lead = static_cast<unsigned char>(*p);
+        if (lead < 0x80)
+        {
+            *written++ = static_cast<wchar_t>(lead);
+            ++p;
+            continue;
+        }
+        const std::size_t two = twoByte(p, end, *written);
+        p += two != 0 ? two : decodeOne(p, end, *written);
+        ++written;
     }
+    return static_cast<std::size_t>(written - out);
 }
 
 void Utf8Codec::encodeOne(wchar_t c, std::string& out)
+{
+    char bytes[4];
+    out.append(bytes, encodeInto(c, bytes));
+}
+
+std::size_t Utf8Codec::encodeInto(wchar_t c, char* out)
 {
     auto value = static_cast<std::uint32_t>(c);
     if (value > 0x10FFFF || (value >= 0xD800 && value <= 0xDFFF))
         value = kReplacement;
     if (value < 0x80)
     {
-        out.push_back(static_cast<char>(value));
+        out[0] = static_cast<char>(value);
+        return 1;
     }
-    else if (value < 0x800)
+    if (value < 0x800)
     {
-        out.push_back(static_cast<char>(0xC0 | (value >> 6)));
-        out.push_back(static_cast<char>(0x80 | (value & 0x3F)));
+        out[0] = static_cast<char>(0xC0 | (value >> 6));
+        out[1] = static_cast<char>(0x80 | (value & 0x3F));
+        return 2;
     }
-    else if (value < 0x10000)
+    if (value < 0x10000)
     {
-        out.push_back(static_cast<char>(0xE0 | (value >> 12)));
-        out.push_back(static_cast<char>(0x80 | ((value >> 6) & 0x3F)));
-        out.push_back(static_cast<char>(0x80 | (value & 0x3F)));
+        out[0] = static_cast<char>(0xE0 | (value >> 12));
+        out[1] = static_cast<char>(0x80 | ((value >> 6) & 0x3F));
+        out[2] = static_cast<char>(0x80 | (value & 0x3F));
+        return 3;
     }
-    else
-    {
-        out.push_back(static_cast<char>(0xF0 | (value >> 18)));
-        out.push_back(static_cast<char>(0x80 | ((value >> 12) & 0x3F)));
-        out.push_back(static_cast<char>(0x80 | ((value >> 6) & 0x3F)));
-        out.push_back(static_cast<char>(0x80 | (value & 0x3F)));
-    }
+    out[0] = static_cast<char>(0xF0 | (value >> 18));
+    out[1] = static_cast<char>(0x80 | ((value >> 12) & 0x3F));
+    out[2] = static_cast<char>(0x80 | ((value >> 6) & 0x3F));
+    out[3] = static_cast<char>(0x80 | (value & 0x3F));
+    return 4;
 }
 
 void Utf8Codec::encode(const wchar_t* data, std::size_t size, std::string& out)
 {
-    out.reserve(out.size() + size);
+    const std::size_t old = out.size();
+    out.resize(old + 4 * size);
+    char* const begin = &out[0];
+    char* p = begin + old;
     for (std::size_t i = 0; i < size; ++i)
-        encodeOne(data[i], out);
+        p += encodeInto(data[i], p);
+    out.resize(static_cast<std::size_t>(p - begin));
 }
 
 std::size_t Utf8Codec::firstInvalid(const char* data, std::size_t size)
@@ -118,7 +173,22 @@ std::size_t Utf8Codec::firstInvalid(const char* data, std::size_t size)
     const char* p = data;
     while (p < end)
     {
+        if (end - p >= 8 && asciiWord(p))
+        {
+            p += 8;
+            continue;
+        }
+        if (static_cast<unsigned char>(*p) < 0x80)
+        {
+            ++p;
+            continue;
+        }
         wchar_t c = 0;
+        if (const std::size_t two = twoByte(p, end, c))
+        {
+            p += two;
+            continue;
+        }
         const std::size_t used = decodeOne(p, end, c);
         // U+FFFD itself is valid when it is written out in full.
         if (c == kReplacement && !(used == 3 && static_cast<unsigned char>(p[0]) == 0xEF &&

@@ -14,9 +14,14 @@ public:
     // or 0 at the end of the input.
     static std::size_t decodeOne(const char* p, const char* end, wchar_t& out);
     static void decode(const char* data, std::size_t size, std::wstring& out);
+    // Decodes `size` bytes into `out`, which has room for `size` characters; returns how many
+    // were written.
+    static std::size_t decodeInto(const char* data, std::size_t size, wchar_t* out);
     // Offset of the first byte that is not valid UTF-8, or `size` when all of it is.
     static std::size_t firstInvalid(const char* data, std::size_t size);
     // Appends the UTF-8 form of `c`; surrogates and values above U+10FFFF give U+FFFD.
     static void encodeOne(wchar_t c, std::string& out);
+    // Writes the UTF-8 form of `c` (at most four bytes) at `out`; returns its length.
+    static std::size_t encodeInto(wchar_t c, char* out);
     static void encode(const wchar_t* data, std::size_t size, std::string& out);
 };

@@ -6,7 +6,6 @@
 #include "BSet.h"
 #include "BString.h"
 #include "Utf8Codec.h"
-#include "WideString.h"
 
 #include <pugixml.hpp>
 
@@ -14,9 +13,9 @@
 #include <cctype>
 #include <charconv>
 #include <cstring>
+#include <cwchar>
 #include <memory>
 #include <system_error>
-#include <unordered_set>
 
 namespace
 {
@@ -27,6 +26,34 @@ const char* const kInt = "Int";
 const char* const kBool = "Bool";
 const char* const kDouble = "Double";
 const char* const kSet = "Set";
+
+bool sameName(const char* name, const char* expected)
+{
+    while (*name != '\0' && *name == *expected)
+    {
+        ++name;
+        ++expected;
+    }
+    return *name == *expected;
+}
+
+// The kind an element name stands for: a set, a scalar kind, or -1 for an unknown name.
+int kindOf(const char* name)
+{
+    switch (name[0])
+    {
+    case 'S':
+        return sameName(name, kSet) ? BData::eSET : sameName(name, kString) ? BData::eSTRING : -1;
+    case 'I':
+        return sameName(name, kInt) ? BData::eINT : -1;
+    case 'D':
+        return sameName(name, kDouble) ? BData::eDOUBLE : -1;
+    case 'B':
+        return sameName(name, kBool) ? BData::eBOOL : -1;
+    default:
+        return -1;
+    }
+}
 
 bool isXmlSpace(char c)
 {
@@ -41,30 +68,56 @@ bool isBlank(const char* text)
     return true;
 }
 
-// The text of a value element: its character data, no child elements allowed.
-bool elementText(const pugi::xml_node& element, std::string& text)
+// The character data of a value element, no child elements allowed. `data` and `size` point at
+// the element's single text node when it has one, else at `buffers.text`.
+bool elementText(const pugi::xml_node& element, XmlSetCodec::Buffers& buffers, const char*& data, std::size_t& size)
 {
-    text.clear();
+    data = "";
+    size = 0;
+    int texts = 0;
     for (pugi::xml_node child = element.first_child(); child; child = child.next_sibling())
     {
         const auto type = child.type();
         if (type == pugi::node_pcdata || type == pugi::node_cdata)
-            text += child.value();
+        {
+            const char* value = child.value();
+            const std::size_t length = std::strlen(value);
+            if (texts == 0)
+            {
+                data = value;
+                size = length;
+            }
+            else
+            {
+                if (texts == 1)
+                    buffers.text.assign(data, size);
+                buffers.text.append(value, length);
+                data = buffers.text.data();
+                size = buffers.text.size();
+            }
+            ++texts;
+        }
         else if (type == pugi::node_element)
             return false;
     }
     return true;
 }
 
-std::string trimmed(const std::string& text)
+// `size` bytes of UTF-8 at `data` decoded into `buffers.wide`; returns the character count.
+std::size_t decodeText(const char* data, std::size_t size, XmlSetCodec::Buffers& buffers)
 {
-    std::size_t begin = 0;
-    std::size_t end = text.size();
-    while (begin < end && isXmlSpace(text[begin]))
-        ++begin;
-    while (end > begin && isXmlSpace(text[end - 1]))
-        --end;
-    return text.substr(begin, end - begin);
+    if (buffers.wide.size() < size)
+        buffers.wide.resize(size);
+    return Utf8Codec::decodeInto(data, size, &buffers.wide[0]);
+}
+
+// The text between `first` and `last` without XML spaces at either end.
+void trim(const char*& first, const char*& last)
+{
+    while (first < last && isXmlSpace(*first))
+        ++first;
+    while (last > first && isXmlSpace(last[-1]))
+        --last;
 }
 
 // windows-1252's characters for the bytes 0x80 to 0x9F; the five it leaves undefined keep their
@@ -116,9 +169,11 @@ std::string singleByteToUtf8(const std::string& bytes, bool windows)
 }
 
 // Brings the document to UTF-8 for the parser, honouring a byte-order mark or the declared
-// encoding. Documents in UTF-16 or UTF-32 (recognised by their first bytes) are left to the
-// parser: `utf8` is then false and `out` untouched.
-bool toUtf8(const std::string& bytes, std::string& out, bool& utf8, std::string& error)
+// encoding: `data` and `size` then give the UTF-8 text, in `bytes` itself or, for a single-byte
+// encoding, in `converted`. Documents in UTF-16 or UTF-32 (recognised by their first bytes) are
+// left to the parser: `utf8` is then false.
+bool toUtf8(const std::string& bytes, std::string& converted, const char*& data, std::size_t& size, bool& utf8,
+            std::string& error)
 {
     utf8 = true;
     const auto byteAt = [&bytes](std::size_t i) { return i < bytes.size() ? static_cast<unsigned char>(bytes[i]) : 0x100; };
@@ -134,12 +189,16 @@ bool toUtf8(const std::string& bytes, std::string& out, bool& utf8, std::string&
     const std::string encoding = start == 0 ? declaredEncoding(bytes) : std::string("utf-8");
     if (encoding == "iso-8859-1" || encoding == "iso8859-1" || encoding == "latin1" || encoding == "latin-1")
     {
-        out = singleByteToUtf8(bytes, false);
+        converted = singleByteToUtf8(bytes, false);
+        data = converted.data();
+        size = converted.size();
         return true;
     }
     if (encoding == "windows-1252" || encoding == "cp1252")
     {
-        out = singleByteToUtf8(bytes, true);
+        converted = singleByteToUtf8(bytes, true);
+        data = converted.data();
+        size = converted.size();
         return true;
     }
     if (!encoding.empty() && encoding != "utf-8" && encoding != "utf8" && encoding != "us-ascii")
@@ -153,72 +212,265 @@ bool toUtf8(const std::string& bytes, std::string& out, bool& utf8, std::string&
         error = "invalid UTF-8 at byte offset " + std::to_string(start + invalid);
         return false;
     }
-    out.assign(bytes, start, std::string::npos);
+    data = bytes.data() + start;
+    size = bytes.size() - start;
     return true;
 }
 
-template <typename T>
-bool parseNumber(const std::string& text, T& value)
+// Whether `bytes` holds "<!DOCTYPE" or "<!ENTITY" anywhere.
+bool hasDeclaration(const std::string& bytes)
 {
-    const std::string digits = trimmed(text);
-    if (digits.empty())
+    const char* const begin = bytes.data();
+    const char* const end = begin + bytes.size();
+    for (const char* p = begin; p < end;)
+    {
+        const auto* mark = static_cast<const char*>(std::memchr(p, '!', static_cast<std::size_t>(end - p)));
+        if (mark == nullptr)
+            return false;
+        const std::size_t rest = static_cast<std::size_t>(end - mark);
+        if (mark > begin && mark[-1] == '<' &&
+            ((rest >= 8 && std::memcmp(mark, "!DOCTYPE", 8) == 0) || (rest >= 7 && std::memcmp(mark, "!ENTITY", 7) == 0)))
+            return true;
+        p = mark + 1;
+    }
+    return false;
+}
+
+template <typename T>
+bool parseNumber(const char* data, std::size_t size, T& value)
+{
+    const char* first = data;
+    const char* last = data + size;
+    trim(first, last);
+    if (first == last)
         return false;
-    const char* first = digits.data();
-    const char* last = digits.data() + digits.size();
     const auto result = std::from_chars(first, last, value);
     return result.ec == std::errc() && result.ptr == last;
 }
 
-std::unique_ptr<BData> parseScalar(const pugi::xml_node& element, const std::string& name, std::string& error)
+std::unique_ptr<BData> parseScalar(const pugi::xml_node& element, int kind, XmlSetCodec::Buffers& buffers,
+                                   std::string& error)
 {
-    std::string text;
-    if (!elementText(element, text))
+    const char* name = element.name();
+    const char* data = nullptr;
+    std::size_t size = 0;
+    if (!elementText(element, buffers, data, size))
     {
-        error = "element <" + name + "> holds child elements";
+        error = std::string("element <") + name + "> holds child elements";
         return nullptr;
     }
-    if (name == kString)
-        return std::make_unique<BString>(WideString::fromUtf8(text));
-    if (name == kInt)
+    if (kind == BData::eSTRING)
+    {
+        const std::size_t length = decodeText(data, size, buffers);
+        return std::make_unique<BString>(buffers.wide.data(), length);
+    }
+    if (kind == BData::eINT)
     {
         long value = 0;
-        if (!parseNumber(text, value))
+        if (!parseNumber(data, size, value))
         {
-            error = "bad Int value '" + text + "'";
+            error = "bad Int value '" + std::string(data, size) + "'";
             return nullptr;
         }
         return std::make_unique<BInt>(value);
     }
-    if (name == kDouble)
+    if (kind == BData::eDOUBLE)
     {
         double value = 0.0;
-        if (!parseNumber(text, value))
+        if (!parseNumber(data, size, value))
         {
-            error = "bad Double value '" + text + "'";
+            error = "bad Double value '" + std::string(data, size) + "'";
             return nullptr;
         }
         return std::make_unique<BDouble>(value);
     }
-    if (name == kBool)
+    if (kind == BData::eBOOL)
     {
-        const std::string word = trimmed(text);
-        if (word != "true" && word != "false")
+        const char* first = data;
+        const char* last = data + size;
+        trim(first, last);
+        const std::size_t length = static_cast<std::size_t>(last - first);
+        const bool isTrue = length == 4 && std::memcmp(first, "true", 4) == 0;
+        if (!isTrue && !(length == 5 && std::memcmp(first, "false", 5) == 0))
         {
-            error = "bad Bool value '" + text + "'";
+            error = "bad Bool value '" + std::string(data, size) + "'";
             return nullptr;
         }
-        return std::make_unique<BBool>(word == "true");
+        return std::make_unique<BBool>(isTrue);
     }
-    error = "unknown element <" + name + ">";
+    error = std::string("unknown element <") + name + ">";
     return nullptr;
 }
 
-// Reads the children of a <BSet> or <Set> element; recursion is bounded by kMaxDepth.
-bool parseChildren(const pugi::xml_node& container, BSet& out, int depth, std::string& error)
+template <typename T>
+void appendNumber(T value, std::string& out)
+{
+    char buffer[64];
+    const auto result = std::to_chars(buffer, buffer + sizeof buffer, value);
+    out.append(buffer, result.ptr);
+}
+
+// Appends `text` as UTF-8 with the XML escapes of element text, or of a double-quoted attribute
+// value with `attribute`: &, < and the control characters always, > in text, " in attributes;
+// tab, line feed and carriage return stay raw in text. False when the text holds a NUL.
+bool appendEscaped(const ACE_WString& text, bool attribute, std::string& out)
+{
+    const wchar_t* const chars = text.fast_rep();
+    const std::size_t length = text.length();
+    // The longest form of one character is six bytes ("&quot;").
+    const std::size_t old = out.size();
+    out.resize(old + 6 * length);
+    char* const begin = &out[0];
+    char* p = begin + old;
+    for (std::size_t i = 0; i < length; ++i)
+    {
+        const wchar_t c = chars[i];
+        if (c >= 0x80)
+        {
+            p += Utf8Codec::encodeInto(c, p);
+            continue;
+        }
+        const char* escape = nullptr;
+        switch (c)
+        {
+        case L'\0':
+            out.resize(old);
+            return false;
+        case L'&':
+            escape = "&amp;";
+            break;
+        case L'<':
+            escape = "&lt;";
+            break;
+        case L'>':
+            escape = attribute ? nullptr : "&gt;";
+            break;
+        case L'"':
+            escape = attribute ? "&quot;" : nullptr;
+            break;
+        default:
+            break;
+        }
+        if (escape != nullptr)
+        {
+            const std::size_t size = std::strlen(escape);
+            std::memcpy(p, escape, size);
+            p += size;
+        }
+        else if (c < 0x20 && (attribute || (c != L'\t' && c != L'\n' && c != L'\r')))
+        {
+            const char code[5] = {'&', '#', static_cast<char>('0' + c / 10), static_cast<char>('0' + c % 10), ';'};
+            std::memcpy(p, code, sizeof code);
+            p += sizeof code;
+        }
+        else
+        {
+            *p++ = static_cast<char>(c);
+        }
+    }
+    out.resize(static_cast<std::size_t>(p - begin));
+    return true;
+}
+
+bool writeChildren(const BSet& set, std::string& out, int depth, std::string& error)
 {
     if (depth > XmlSetCodec::kMaxDepth)
     {
         error = "sets nested deeper than " + std::to_string(XmlSetCodec::kMaxDepth);
+        return false;
+    }
+    for (int i = 0; i < set.size(); ++i)
+    {
+        const BData& value = set.valueAt(i);
+        const char* name = kString;
+        switch (value.type())
+        {
+        case BData::eSTRING:
+            if (std::wmemchr(static_cast<const BString&>(value).value().fast_rep(), L'\0',
+                             static_cast<const BString&>(value).value().length()) != nullptr)
+            {
+                error = "string value holds a NUL character";
+                return false;
+            }
+            break;
+        case BData::eINT:
+            name = kInt;
+            break;
+        case BData::eBOOL:
+            name = kBool;
+            break;
+        case BData::eDOUBLE:
+            name = kDouble;
+            break;
+        case BData::eSET:
+            name = kSet;
+            break;
+        }
+        out += '<';
+        out += name;
+        out += " key=\"";
+        if (!appendEscaped(set.keyAt(i), true, out))
+        {
+            error = "key holds a NUL character";
+            return false;
+        }
+        out += '"';
+        switch (value.type())
+        {
+        case BData::eSTRING:
+        {
+            const ACE_WString& text = static_cast<const BString&>(value).value();
+            if (text.length() == 0)
+            {
+                out += "/>";
+                continue;
+            }
+            out += '>';
+            appendEscaped(text, false, out);
+            break;
+        }
+        case BData::eINT:
+            out += '>';
+            appendNumber(static_cast<const BInt&>(value).value(), out);
+            break;
+        case BData::eBOOL:
+            out += static_cast<const BBool&>(value).value() ? ">true" : ">false";
+            break;
+        case BData::eDOUBLE:
+            out += '>';
+            appendNumber(static_cast<const BDouble&>(value).value(), out);
+            break;
+        case BData::eSET:
+        {
+            const auto& nested = static_cast<const BSet&>(value);
+            if (nested.isEmpty())
+            {
+                // Still checked, so an empty set too deep is refused.
+                if (!writeChildren(nested, out, depth + 1, error))
+                    return false;
+                out += "/>";
+                continue;
+            }
+            out += '>';
+            if (!writeChildren(nested, out, depth + 1, error))
+                return false;
+            break;
+        }
+        }
+        out += "</";
+        out += name;
+        out += '>';
+    }
+    return true;
+}
+}
+
+bool XmlSetCodec::parseChildren(const pugi::xml_node& container, BSet& out, int depth, Buffers& buffers,
+                                std::string& error)
+{
+    if (depth > kMaxDepth)
+    {
+        error = "sets nested deeper than " + std::to_string(kMaxDepth);
         return false;
     }
     for (pugi::xml_node child = container.first_child(); child; child = child.next_sibling())
@@ -235,120 +487,48 @@ bool parseChildren(const pugi::xml_node& container, BSet& out, int depth, std::s
         }
         if (type != pugi::node_element)
             continue; // comments, processing instructions
-        const std::string name = child.name();
-        const pugi::xml_attribute keyAttribute = child.attribute(kKey);
+        // The key is normally the only attribute.
+        pugi::xml_attribute keyAttribute = child.first_attribute();
+        if (keyAttribute && !sameName(keyAttribute.name(), kKey))
+            keyAttribute = child.attribute(kKey);
         if (!keyAttribute)
         {
-            error = "element <" + name + "> without a key";
+            error = std::string("element <") + child.name() + "> without a key";
             return false;
         }
-        const ACE_WString key = WideString::fromUtf8(keyAttribute.value());
-        if (out.contains(key))
+        const char* keyText = keyAttribute.value();
+        const std::size_t keyLength = decodeText(keyText, std::strlen(keyText), buffers);
+        std::size_t hash = 0;
+        if (out.lookUp(buffers.wide.data(), keyLength, hash) >= 0)
         {
-            error = std::string("duplicate key '") + keyAttribute.value() + "'";
+            error = std::string("duplicate key '") + keyText + "'";
             return false;
         }
+        ACE_WString key(buffers.wide.data(), keyLength);
         std::unique_ptr<BData> value;
-        if (name == kSet)
+        const int kind = kindOf(child.name());
+        if (kind == BData::eSET)
         {
             auto nested = std::make_unique<BSet>();
-            if (!parseChildren(child, *nested, depth + 1, error))
+            if (!parseChildren(child, *nested, depth + 1, buffers, error))
                 return false;
             value = std::move(nested);
         }
         else
         {
-            value = parseScalar(child, name, error);
+            value = parseScalar(child, kind, buffers, error);
             if (!value)
                 return false;
         }
-        out.put(key, std::move(value));
+        out.append(key, std::move(value), hash);
     }
     return true;
-}
-
-template <typename T>
-std::string formatNumber(T value)
-{
-    char buffer[64];
-    const auto result = std::to_chars(buffer, buffer + sizeof buffer, value);
-    return std::string(buffer, result.ptr);
-}
-
-bool writeChildren(const BSet& set, pugi::xml_node& container, int depth, std::string& error)
-{
-    if (depth > XmlSetCodec::kMaxDepth)
-    {
-        error = "sets nested deeper than " + std::to_string(XmlSetCodec::kMaxDepth);
-        return false;
-    }
-    for (int i = 0; i < set.size(); ++i)
-    {
-        const BData& value = set.valueAt(i);
-        const char* name = kString;
-        std::string text;
-        switch (value.type())
-        {
-        case BData::eSTRING:
-            text = WideString::toUtf8(static_cast<const BString&>(value).value());
-            if (text.find('\0') != std::string::npos)
-            {
-                error = "string value holds a NUL character";
-                return false;
-            }
-            break;
-        case BData::eINT:
-            name = kInt;
-            text = formatNumber(static_cast<const BInt&>(value).value());
-            break;
-        case BData::eBOOL:
-            name = kBool;
-            text = static_cast<const BBool&>(value).value() ? "true" : "false";
-            break;
-        case BData::eDOUBLE:
-            name = kDouble;
-            text = formatNumber(static_cast<const BDouble&>(value).value());
-            break;
-        case BData::eSET:
-            name = kSet;
-            break;
-        }
-        const std::string key = WideString::toUtf8(set.keyAt(i));
-        if (key.find('\0') != std::string::npos)
-        {
-            error = "key holds a NUL character";
-            return false;
-        }
-        pugi::xml_node element = container.append_child(name);
-        element.append_attribute(kKey).set_value(key.c_str());
-        if (value.type() == BData::eSET)
-        {
-            if (!writeChildren(static_cast<const BSet&>(value), element, depth + 1, error))
-                return false;
-        }
-        else if (!text.empty())
-        {
-            element.append_child(pugi::node_pcdata).set_value(text.c_str());
-        }
-    }
-    return true;
-}
-
-class StringWriter : public pugi::xml_writer
-{
-public:
-    explicit StringWriter(std::string& out) : m_out(out) {}
-    void write(const void* data, size_t size) override { m_out.append(static_cast<const char*>(data), size); }
-
-private:
-    std::string& m_out;
-};
 }
 
 bool XmlSetCodec::parse(const std::string& bytes, BSet& out, std::string& error)
 {
     // Document type declarations (and with them entity declarations) are refused outright.
-    if (bytes.find("<!DOCTYPE") != std::string::npos || bytes.find("<!ENTITY") != std::string::npos)
+    if (hasDeclaration(bytes))
     {
         error = "document type or entity declarations are not accepted";
         return false;
@@ -357,12 +537,14 @@ bool XmlSetCodec::parse(const std::string& bytes, BSet& out, std::string& error)
     // No end-of-line normalisation: a "\r" written raw inside a value must come back as it was.
     const unsigned int flags =
         (pugi::parse_default & ~pugi::parse_eol) | pugi::parse_ws_pcdata | pugi::parse_doctype;
-    std::string utf8Bytes;
+    std::string converted;
+    const char* data = nullptr;
+    std::size_t size = 0;
     bool utf8 = true;
-    if (!toUtf8(bytes, utf8Bytes, utf8, error))
+    if (!toUtf8(bytes, converted, data, size, utf8, error))
         return false;
     const pugi::xml_parse_result result =
-        utf8 ? document.load_buffer(utf8Bytes.data(), utf8Bytes.size(), flags, pugi::encoding_utf8)
+        utf8 ? document.load_buffer(data, size, flags, pugi::encoding_utf8)
              : document.load_buffer(bytes.data(), bytes.size(), flags, pugi::encoding_auto);
     if (!result)
     {
@@ -403,21 +585,28 @@ bool XmlSetCodec::parse(const std::string& bytes, BSet& out, std::string& error)
         error = std::string("root element is not <") + kRoot + ">";
         return false;
     }
-    return parseChildren(root, out, 1, error);
+    Buffers buffers;
+    return parseChildren(root, out, 1, buffers, error);
 }
 
 bool XmlSetCodec::write(const BSet& set, std::string& out, std::string& error)
 {
-    pugi::xml_document document;
-    pugi::xml_node declaration = document.append_child(pugi::node_declaration);
-    declaration.append_attribute("version").set_value("1.0");
-    declaration.append_attribute("encoding").set_value("UTF-8");
-    pugi::xml_node root = document.append_child(kRoot);
-    if (!writeChildren(set, root, 1, error))
-        return false;
-    out.clear();
-    StringWriter writer(out);
-    document.save(writer, "", pugi::format_raw, pugi::encoding_utf8);
-    out += '\n';
+    // No indentation, so no whitespace is added to values. Built aside so that `out` is left
+    // alone on failure.
+    std::string text = "<?xml version=\"1.0\" encoding=\"UTF-8\"?><";
+    text += kRoot;
+    if (set.isEmpty())
+        text += "/>";
+    else
+    {
+        text += '>';
+        if (!writeChildren(set, text, 1, error))
+            return false;
+        text += "</";
+        text += kRoot;
+        text += '>';
+    }
+    text += '\n';
+    out.swap(text);
     return true;
 }

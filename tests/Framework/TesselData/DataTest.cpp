@@ -10,6 +10,8 @@
 #include <gtest/gtest.h>
 
 #include <limits>
+#include <string>
+#include <utility>
 
 namespace
 {
@@ -58,6 +60,61 @@ TEST(BSet, KeepsInsertionOrderReplacesInPlaceAndCopiesDeeply)
     outer.setSet(L"self"_w, outer); // storing a set in itself stores its old content
     ASSERT_EQ(outer.getSet(L"self"_w, set), BSet::eOK);
     EXPECT_FALSE(set.contains(L"self"_w));
+}
+
+// Sets small and large (large ones are indexed) find every key after inserts, a removal, a copy
+// and a move.
+TEST(BSet, FindsEveryKeyAtAnySize)
+{
+    for (const int size : {1, 15, 16, 17, 40, 300})
+    {
+        SCOPED_TRACE(size);
+        BSet set;
+        for (int i = 0; i < size; ++i)
+            set.setInt(wide("k" + std::to_string(i)), i);
+        set.setInt(L"k0"_w, -1); // replaced in place, not added
+        ASSERT_EQ(set.size(), size);
+        EXPECT_EQ(BDataUtilities::removeBSetSubElement(set, wide("k" + std::to_string(size / 2))), 0);
+        BSet copy(set);
+        const BSet moved(std::move(copy));
+        for (const BSet* each : {static_cast<const BSet*>(&set), &moved})
+        {
+            for (int i = 0; i < size; ++i)
+            {
+                long value = 0;
+                const int code = each->getInt(wide("k" + std::to_string(i)), value);
+                EXPECT_EQ(code, i == size / 2 ? BSet::eNO_SUCH_KEY : BSet::eOK) << i;
+                EXPECT_TRUE(code != BSet::eOK || value == (i == 0 ? -1 : i)) << i;
+            }
+            EXPECT_FALSE(each->contains(L"k"_w) || each->contains(wide("k" + std::to_string(size))));
+        }
+    }
+}
+
+TEST(BSet, MovesInAndEditsNestedSetsInPlace)
+{
+    BSet inner;
+    for (int i = 0; i < 20; ++i)
+        inner.setString(wide("u" + std::to_string(i)), wide(std::to_string(i)));
+    const BSet expected(inner);
+    BSet outer;
+    outer.setString(L"s"_w, L"not a set"_w);
+    outer.setSet(L"m"_w, std::move(inner));
+    EXPECT_TRUE(outer.find(L"m"_w) != nullptr && outer.find(L"m"_w)->equals(expected));
+    EXPECT_TRUE(inner.isEmpty()); // NOLINT(bugprone-use-after-move): a moved-in set is left empty and usable
+    inner.setInt(L"again"_w, 1);
+    EXPECT_EQ(inner.size(), 1);
+
+    outer.editSet(L"s"_w).setInt(L"x"_w, 1);     // another kind is replaced at its place
+    outer.editSet(L"m"_w).setInt(L"u3"_w, 3);    // an existing set is changed, keeping its other keys
+    outer.editSet(L"new"_w).setBool(L"y"_w, true); // a missing key is added at the end
+    EXPECT_EQ(keysOf(outer), "smnew");
+    BSet m;
+    ASSERT_EQ(outer.getSet(L"m"_w, m), BSet::eOK);
+    long three = 0;
+    EXPECT_TRUE(m.size() == 20 && m.getInt(L"u3"_w, three) == BSet::eOK && three == 3 && m.contains(L"u19"_w));
+    BSet s;
+    EXPECT_TRUE(outer.getSet(L"s"_w, s) == BSet::eOK && s.size() == 1);
 }
 
 TEST(BSet, TypedReadsReportCodesAndLeaveOutputUntouched)

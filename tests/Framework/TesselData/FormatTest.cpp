@@ -67,6 +67,11 @@ TEST(WideString, ConvertsExactlyAndReplacesInvalidBytes)
         {"\xED\xA0\x80", L"\uFFFD"},                // surrogate
         {"\xF4\x90\x80\x80", L"\uFFFD"},            // above U+10FFFF
         {"\x80x\xFE", L"\uFFFDx\uFFFD"},            // stray continuation and invalid lead
+        // Runs of eight ASCII bytes and two-byte sequences next to them.
+        {"abcdefgh\xC3\xA9" "12345678", L"abcdefgh\u00E9" "12345678"},
+        {"abcdefgh\xC3" "abcdefgh", L"abcdefgh\uFFFDabcdefgh"},
+        {"abcdefg\xC3", L"abcdefg\uFFFD"},
+        {"\xC2\x80\xDF\xBF\xC1\xBF", L"\u0080\u07FF\uFFFD\uFFFD"}, // lowest, highest, overlong
     };
     for (const auto& c : cases)
     {

@@ -6,8 +6,11 @@
 
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <cmath>
 #include <limits>
+#include <string>
+#include <vector>
 
 namespace
 {
@@ -35,6 +38,13 @@ TEST(XmlFile, RoundTripKeepsOrderTypesAndEveryValue)
     TempDir dir;
     const std::string path = dir.file("settings.xml");
     ASSERT_TRUE(sampleSet().save(wide(path), false));
+    // The escapes as written: markup and control characters in text, also tabs and line breaks
+    // and quotes in keys.
+    const std::string written = TempDir::read(path);
+    for (const char* part : {"<String key=\"lines\">one\ntwo\r\nthree\r</String>",
+                             "<String key=\"markup\">&lt;a href=\"x\"&gt;&amp;amp; 'q'&lt;/a&gt; ]]&gt; &#01;&#31;\x7f</String>",
+                             "<String key=\"k\xC3\xA9y &lt;&amp;> &quot;q&quot; &#09;&#10;\"/>", "<Set key=\"empty\"/>"})
+        EXPECT_NE(written.find(part), std::string::npos) << part;
     BSet loaded;
     loaded.setInt(L"stale"_w, 1); // a load replaces the whole content
     ASSERT_TRUE(loaded.load(wide(path)));
@@ -85,5 +95,28 @@ TEST(XmlFile, BadFileIsRefusedAndLeavesTheSetUnchanged)
         EXPECT_TRUE(log.containsSubstring("BData::load", TesselLog_Static::eWARNING));
     }
     EXPECT_FALSE(BInt(3).load(wide(path)) || BInt(3).save(wide(path), false)) << "only sets are files";
+}
+
+// The refusal names the first byte that is not UTF-8, after ASCII runs and valid sequences.
+TEST(XmlFile, InvalidUtf8IsRefusedAtItsOffset)
+{
+    const struct { std::string value; int offset; } cases[] = {
+        {"abcdefghij\xC3(", 32},
+        {"\xC3\xA9\xC3\xA9\xE2\x82\xAC\x80", 29},
+        {"\xEF\xBF\xBD" "abcdefgh\xED\xA0\x80", 33}, // U+FFFD written out is valid, a surrogate is not
+    };
+    TempDir dir;
+    const std::string path = dir.file("bad.xml");
+    for (const auto& c : cases)
+    {
+        TempDir::write(path, "<BSet><String key=\"s\">" + c.value + "</String></BSet>");
+        BSet set;
+        LogCapture log;
+        EXPECT_FALSE(set.load(wide(path)));
+        const std::vector<std::string> warnings = log.messages(TesselLog_Static::eWARNING);
+        const std::string expected = "invalid UTF-8 at byte offset " + std::to_string(c.offset);
+        ASSERT_EQ(warnings.size(), 1u);
+        EXPECT_EQ(warnings[0].substr(warnings[0].size() - std::min(warnings[0].size(), expected.size())), expected);
+    }
 }
 }

@@ -1,7 +1,12 @@
 #include "UsersUpdater.h"
 
+#include "BString.h"
 #include "StringUtilities.h"
 #include "TesselLog_Static.h"
+
+#include <algorithm>
+#include <cwchar>
+#include <iterator>
 
 
 namespace
@@ -46,9 +51,13 @@ void warn(const wchar_t* prefix, const wchar_t* text)
 
 void traceStarted(const wchar_t* prefix)
 {
-    ACE_WString message(prefix);
-    message += L": Method started.";
-    trace(message.c_str());
+    // Built on the stack: the prefixes are short literals of this file.
+    static const wchar_t kStarted[] = L": Method started.";
+    wchar_t message[256];
+    const std::size_t length = std::min(std::wcslen(prefix), std::size(message) - std::size(kStarted));
+    std::wmemcpy(message, prefix, length);
+    std::wmemcpy(message + length, kStarted, std::size(kStarted));
+    trace(message);
 }
 
 // The operations' common entry: trace, then whether the store may be used.
@@ -60,13 +69,31 @@ bool enter(bool loaded, const wchar_t* prefix)
     return loaded;
 }
 
-ACE_WString slotKey(unsigned int slot)
+// One of this file's key literals as a key, without copying it.
+ACE_WString keyOf(const wchar_t* literal)
 {
-    return StringUtilities::wideSprintf(L"user%d", static_cast<int>(slot));
+    return ACE_WString(literal, nullptr, false);
+}
+
+// "user" followed by the slot number in decimal, written into `text`; the key refers to it.
+ACE_WString slotKey(unsigned int slot, wchar_t (&text)[16])
+{
+    wchar_t digits[12];
+    std::size_t count = 0;
+    do
+    {
+        digits[count++] = static_cast<wchar_t>(L'0' + slot % 10);
+        slot /= 10;
+    } while (slot != 0);
+    std::wmemcpy(text, L"user", 4);
+    std::size_t length = 4;
+    while (count > 0)
+        text[length++] = digits[--count];
+    return ACE_WString(text, length, nullptr, false);
 }
 
 // The nested set under key, read in place; null when absent or not a set.
-const BSet* nestedSet(const BSet& parent, const wchar_t* key)
+const BSet* nestedSet(const BSet& parent, const ACE_WString& key)
 {
     const BData* value = parent.find(key);
     return value != nullptr && value->type() == BData::eSET ? static_cast<const BSet*>(value) : nullptr;
@@ -86,16 +113,37 @@ ACE_WString readSlotField(const BSet& content, unsigned int slot, const wchar_t*
     const BSet* users = nestedSet(content, kUsers);
     if (users == nullptr)
         return ACE_WString();
-    return readString(nestedSet(*users, slotKey(slot).c_str()), field);
+    wchar_t text[16];
+    return readString(nestedSet(*users, slotKey(slot, text)), field);
 }
 
 bool isUsedName(const ACE_WString& name)
 {
-    return name.length() != 0 && name != ACE_WString(kFreeSlot);
+    return name.length() != 0 && !(name.length() == 1 && name[0] == kFreeSlot[0]);
+}
+
+// The number of consecutive used slots from slot `from` + 1 on, plus `from`.
+unsigned int countUsedSlots(const BSet& content, unsigned int from)
+{
+    const BSet* users = nestedSet(content, keyOf(kUsers));
+    unsigned int count = from;
+    if (users == nullptr)
+        return count;
+    const ACE_WString nameKey = keyOf(kName);
+    while (count < kMaxUserCount)
+    {
+        wchar_t text[16];
+        const BSet* slot = nestedSet(*users, slotKey(count + 1, text));
+        const BData* name = slot != nullptr ? slot->find(nameKey) : nullptr;
+        if (name == nullptr || name->type() != BData::eSTRING || !isUsedName(static_cast<const BString*>(name)->value()))
+            break;
+        ++count;
+    }
+    return count;
 }
 }
 
-UsersUpdater::UsersUpdater(const ACE_WString& path) : m_path(path), m_content(10), m_loaded(false)
+UsersUpdater::UsersUpdater(const ACE_WString& path) : m_path(path), m_content(10), m_loaded(false), m_userCount(0)
 {
     trace(L"[UsersUpdater::UsersUpdater(const ACE_WString&)]: Constructor started.");
 }
@@ -129,9 +177,9 @@ bool UsersUpdater::load()
     if (!m_loaded)
         return false;
     m_content = std::move(fromFile);
+    m_userCount = countUsedSlots(m_content, 0);
 
-    BSet app2App(10);
-    if (m_content.getSet(kApp2App, app2App) != 0)
+    if (nestedSet(m_content, kApp2App) == nullptr)
     {
         BSet requestAttributes(10);
         requestAttributes.setString(kApplication, L"vexa");
@@ -139,8 +187,8 @@ bool UsersUpdater::load()
         BSet defaults(10);
         defaults.setInt(kNumRetries, 3);
         defaults.setDouble(kTimeout, 3.0);
-        defaults.setSet(kRequestAttributes, requestAttributes);
-        m_content.setSet(kApp2App, defaults);
+        defaults.setSet(kRequestAttributes, std::move(requestAttributes));
+        m_content.setSet(kApp2App, std::move(defaults));
     }
     return m_loaded;
 }
@@ -168,17 +216,7 @@ unsigned int UsersUpdater::getUserCount()
 {
     if (!enter(m_loaded, L"[unsigned int UsersUpdater::getUserCount()]"))
         return 0;
-    const BSet* users = nestedSet(m_content, kUsers);
-    unsigned int count = 0;
-    if (users == nullptr)
-        return count;
-    for (unsigned int slot = 1; slot <= kMaxUserCount; ++slot)
-    {
-        if (!isUsedName(readString(nestedSet(*users, slotKey(slot).c_str()), kName)))
-            break;
-        count = slot;
-    }
-    return count;
+    return m_userCount;
 }
 
 const ACE_WString UsersUpdater::getUserName(unsigned int index)
@@ -236,16 +274,14 @@ bool UsersUpdater::addUser(const ACE_WString& name, const ACE_WString& address, 
         warn(kAddUserPrefix, L": Max user count reached");
         return false;
     }
-    BSet users(10);
-    m_content.getSet(kUsers, users);
-    const ACE_WString key = slotKey(count + 1);
-    BSet slot(10);
-    users.getSet(key, slot);
-    slot.setString(kName, name);
-    slot.setString(kAddress, address);
-    slot.setString(kTelephone, phone);
-    users.setSet(key, slot);
-    m_content.setSet(kUsers, users);
+    wchar_t text[16];
+    BSet& slot = m_content.editSet(keyOf(kUsers)).editSet(slotKey(count + 1, text));
+    slot.setString(keyOf(kName), name);
+    slot.setString(keyOf(kAddress), address);
+    slot.setString(keyOf(kTelephone), phone);
+    // Filling a gap joins the used slots after it.
+    if (isUsedName(name))
+        m_userCount = countUsedSlots(m_content, count + 1);
     return true;
 }
 
@@ -253,19 +289,20 @@ bool UsersUpdater::removeAllUsers()
 {
     if (!enter(m_loaded, L"[bool UsersUpdater::removeAllUsers()]"))
         return false;
-    BSet users(10);
-    m_content.getSet(kUsers, users);
+    BSet& users = m_content.editSet(keyOf(kUsers));
+    const ACE_WString nameKey = keyOf(kName);
+    const ACE_WString addressKey = keyOf(kAddress);
+    const ACE_WString telephoneKey = keyOf(kTelephone);
+    const ACE_WString freeMark(kFreeSlot);
     for (unsigned int number = 1; number <= kMaxUserCount; ++number)
     {
-        const ACE_WString key = slotKey(number);
-        BSet slot(10);
-        users.getSet(key, slot);
-        slot.setString(kName, kFreeSlot);
-        slot.setString(kAddress, kFreeSlot);
-        slot.setString(kTelephone, kFreeSlot);
-        users.setSet(key, slot);
+        wchar_t text[16];
+        BSet& slot = users.editSet(slotKey(number, text));
+        slot.setString(nameKey, freeMark);
+        slot.setString(addressKey, freeMark);
+        slot.setString(telephoneKey, freeMark);
     }
-    m_content.setSet(kUsers, users);
+    m_userCount = 0;
     return true;
 }
 
@@ -282,8 +319,11 @@ bool UsersUpdater::doesUserExist(const ACE_WString& name)
     if (users == nullptr)
         return false;
     for (unsigned int slot = 1; slot <= kMaxUserCount; ++slot)
-        if (readString(nestedSet(*users, slotKey(slot).c_str()), kName) == name)
+    {
+        wchar_t text[16];
+        if (readString(nestedSet(*users, slotKey(slot, text)), kName) == name)
             return true;
+    }
     return false;
 }
 
@@ -308,15 +348,10 @@ bool UsersUpdater::setApp2AppParams(const ACE_WString& port, const ACE_WString& 
     if (!enter(m_loaded,
                L"[bool UsersUpdater::setApp2AppParams(const ACE_WString&, const ACE_WString&, const ACE_WString&)]"))
         return false;
-    BSet app2App(10);
-    m_content.getSet(kApp2App, app2App);
-    BSet requestAttributes(10);
-    app2App.getSet(kRequestAttributes, requestAttributes);
+    BSet& app2App = m_content.editSet(kApp2App);
     app2App.setString(kPort, port);
     app2App.setString(kIP, ip);
-    requestAttributes.setString(kDealerId, dealerId);
-    app2App.setSet(kRequestAttributes, requestAttributes);
-    m_content.setSet(kApp2App, app2App);
+    app2App.editSet(kRequestAttributes).setString(kDealerId, dealerId);
     return true;
 }
 

@@ -43,4 +43,6 @@ private:
     ACE_WString m_path;
     BSet m_content;
     bool m_loaded;
+    // Consecutive used slots from slot 1, kept by load, addUser and removeAllUsers.
+    unsigned int m_userCount;
 };
