@@ -16,6 +16,7 @@
 #include "OnLineUpdateCommand.h"
 #include "PMediator.h"
 #include "UsersUpdater.h"
+#include "WideString.h"
 #include "WorkshopInfoUpdater.h"
 
 #include <ace/Guard_T.h>
@@ -164,7 +165,8 @@ ToolConfigurationCommand::ToolConfigurationCommand(const QString& commandID)
       m_app2AppIP(),
       m_app2AppValues(10),
       m_storesMutex(),
-      m_fileSystemWatcher()
+      m_fileSystemWatcher(),
+      m_ownSaves()
 {
     m_dataManager.acquire(ID(kDataManagerID));
     m_fileSystemWatcher.acquire(ID(kWatcherID));
@@ -264,6 +266,12 @@ void ToolConfigurationCommand::handleEvent(const CustomEvent& event)
     if (updatePath.is_empty())
         updatePath = kUpdateFileDefault;
 
+    const bool watched = changedPath == workshopPath || changedPath == usersPath || changedPath == updatePath;
+    if (watched && m_ownSaves.isOwnSave(WideString::toUtf8(changedPath)))
+    {
+        trace(L"[ToolConfigurationCommand::handleEvent(CustomEvent)]: Our own save, nothing to rebuild.");
+        return;
+    }
     if (changedPath == workshopPath)
     {
         createDMData(false);
@@ -281,8 +289,8 @@ void ToolConfigurationCommand::handleEvent(const CustomEvent& event)
 
 void ToolConfigurationCommand::refreshUsersListData()
 {
-    UsersCommand usersCommand(QString("WC_USERSCOMMAND"));
-    usersCommand.createDMUsersData();
+    // The users command publishes the list when it is made.
+    const UsersCommand usersCommand(QString("WC_USERSCOMMAND"));
 }
 
 void ToolConfigurationCommand::createDMData(bool reset)
@@ -560,41 +568,51 @@ void ToolConfigurationCommand::createDataForCombo(const ACE_WString& name)
     if (!m_dataManager.isAvailable() || m_pWorkshopInfoUpdater == nullptr)
         return;
 
-    BSet brands(10);
-    m_dataManager->getData(ID(kBrandsUri), brands);
+    // The brand table read in place: keys padded for sorting, and the default labels.
+    struct Brand
+    {
+        std::wstring padded;
+        ACE_WString defaultLabel;
+    };
+    std::vector<Brand> brands;
+    std::vector<std::pair<std::wstring, size_t>> byKey;
+    m_dataManager->visitValues(ID(kBrandsUri), [&](const ACE_WString& key, const BData& value) {
+        byKey.emplace_back(WideString::toStd(key), brands.size());
+        brands.push_back({WideString::toStd(padBrandKey(key)),
+                          value.type() == BData::eSTRING ? static_cast<const BString&>(value).value() : ACE_WString()});
+    });
 
     SmartProxy<PBText> bText;
     if (!bText.acquire(ID(kBTextID)))
         return;
 
-    const StringSet keys = brands.getAllKeys();
+    // A brand's default label is the table's value under its padded key.
+    std::sort(byKey.begin(), byKey.end());
+    const auto defaultLabelOf = [&](const std::wstring& padded) {
+        const auto it = std::lower_bound(byKey.begin(), byKey.end(), std::make_pair(padded, size_t(0)));
+        return it != byKey.end() && it->first == padded ? brands[it->second].defaultLabel : ACE_WString();
+    };
     std::vector<std::wstring> paddedKeys;
-    for (int i = 0; i < keys.length(); ++i)
-    {
-        ACE_WString key;
-        keys.getAt(i, key);
-        const ACE_WString padded = padBrandKey(key);
-        paddedKeys.emplace_back(padded.c_str(), padded.length());
-    }
+    paddedKeys.reserve(brands.size());
+    for (const Brand& brand : brands)
+        paddedKeys.push_back(brand.padded);
     std::sort(paddedKeys.begin(), paddedKeys.end());
 
-    BSet items(10);
+    auto items = std::make_unique<BSet>(static_cast<int>(paddedKeys.size()));
     ACE_WString firstLabel;
     for (size_t i = 0; i < paddedKeys.size(); ++i)
     {
-        const ACE_WString paddedKey(paddedKeys[i].c_str(), paddedKeys[i].size());
+        const ACE_WString paddedKey = WideString::fromStd(paddedKeys[i]);
         const int number = StringUtilities::toInt(paddedKey.c_str());
-        ACE_WString defaultLabel;
-        brands.getString(paddedKey, defaultLabel);
-        const ACE_WString label = bText->getText(number, defaultLabel);
-        items.set(paddedKey, BString(label));
+        auto label = std::make_unique<BString>(bText->getText(number, defaultLabelOf(paddedKeys[i])));
         if (i == 0)
-            firstLabel = label;
+            firstLabel = label->value();
+        items->put(paddedKey, std::move(label));
     }
 
     BSet record(10);
-    record.set(L"state", BInt(kStateEditable));
-    record.set(L"value", items);
+    record.put(L"state", std::make_unique<BInt>(kStateEditable));
+    record.put(L"value", std::move(items));
 
     ACE_WString selected = m_pWorkshopInfoUpdater->getDefaultBrand();
     if (selected.is_empty() && !paddedKeys.empty())
@@ -797,6 +815,13 @@ void ToolConfigurationCommand::onOKButtonClicked()
     if (m_pUpdateUpdater != nullptr)
         saveOnlineUpdateAndTask();
 
+    ACE_WString updatePath = readPath(kUpdateFileDefault, kUpdateFileUri);
+    if (updatePath.is_empty())
+        updatePath = kUpdateFileDefault;
+    for (const ACE_WString& path : {readPath(kWorkshopFileDefault, kWorkshopFileUri),
+                                    readPath(kUsersFileDefault, kUsersFileUri), updatePath})
+        m_ownSaves.remember(WideString::toUtf8(path));
+
     SmartProxy<PMediator> mediator;
     if (mediator.acquire(ID(kMediatorID)))
         mediator->closeDialog();
@@ -809,11 +834,7 @@ void ToolConfigurationCommand::onCancelButtonClicked()
         mediator->closeDialog();
 
     createDMData(true);
-
-    {
-        UsersCommand usersCommand(QString("WC_USERSCOMMAND"));
-        usersCommand.createDMUsersData();
-    }
+    refreshUsersListData();
     mediator.giveBack();
 }
 
