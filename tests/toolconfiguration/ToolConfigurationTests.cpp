@@ -598,4 +598,31 @@ INSTANTIATE_TEST_SUITE_P(Files, OwnSave,
                          ::testing::Values(OwnSaveCase{"Workshop", 'w'}, OwnSaveCase{"Users", 'u'},
                                            OwnSaveCase{"Update", 'p'}),
                          [](const auto& info) { return std::string(info.param.label); });
+
+// Brand items are keyed by the padded brand key, in its order; a brand without a text shows the
+// value under its padded key, and keys that pad alike make one item.
+TEST_F(Publication, BrandItemsArePaddedSortedAndMergedWithTheirDefaultLabels)
+{
+    BSet brands(10);
+    brands.setString(L"12"_w, L"Twelve"_w);
+    brands.setString(L"7"_w, L"Seven"_w);
+    brands.setString(L"0007"_w, L"Zero seven"_w);
+    brands.setString(L"2"_w, L"Two"_w);
+    ASSERT_EQ(m_dataManager->createData(ID(Uri::kBrands), brands), 0);
+    makeCommand();
+    const BSet combo = record("BrandCombo");
+    BSet items;
+    ASSERT_EQ(combo.getSet(L"value"_w, items), 0);
+    std::string shownItems;
+    for (int i = 0; i < items.size(); ++i)
+    {
+        ACE_WString label;
+        items.getString(items.keyAt(i), label);
+        shownItems += utf8(items.keyAt(i)) + "=" + utf8(label) + " ";
+    }
+    EXPECT_EQ(shownItems, "0002=Marque B 0007=Zero seven 0012= ");
+    ACE_WString selected;
+    combo.getString(L"selected"_w, selected);
+    EXPECT_EQ(utf8(selected), "Marque B");
+}
 }

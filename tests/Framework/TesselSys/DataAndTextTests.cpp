@@ -193,6 +193,13 @@ TEST_F(ComponentFixture, TextsComeFromTheCatalogueOrAreExactlyTheDefault)
                   utf8(m_text->getText(L"brand_a"_w, L"d"_w)),
               "Ajouter|Marque \u00e9| d ||d");
 
+    // A number names the text of its decimal form, sign and all.
+    for (const int number : {0, 7, -42, 2147483647, -2147483647 - 1})
+    {
+        m_text->setText(wide(std::to_string(number)), wide("n" + std::to_string(number)));
+        EXPECT_EQ(utf8(m_text->getText(number, L"d"_w)), "n" + std::to_string(number));
+    }
+
     SmartProxy<PBText> proxy; // the proxy answers the default once the component is gone
     ASSERT_TRUE(proxy.acquire(ID(CBText::componentID)));
     EXPECT_EQ(utf8(proxy->getText(969, L"d"_w)) + utf8(proxy->getText(L"969"_w, L"d"_w)), "AjouterAjouter");

@@ -26,7 +26,9 @@
 
 #include <algorithm>
 #include <memory>
+#include <numeric>
 #include <string>
+#include <string_view>
 #include <vector>
 
 namespace
@@ -118,13 +120,17 @@ QString chooseDirectory()
 }
 
 // The brand number right-justified to four characters with '0'; longer keys stay as they are.
+const size_t kBrandKeyWidth = 4;
+
 ACE_WString padBrandKey(const ACE_WString& key)
 {
-    ACE_WString padded;
-    for (size_t i = key.length(); i < 4; ++i)
-        padded += L'0';
-    padded += key;
-    return padded;
+    if (key.length() >= kBrandKeyWidth)
+        return key;
+    wchar_t padded[kBrandKeyWidth];
+    const size_t zeros = kBrandKeyWidth - key.length();
+    std::fill(padded, padded + zeros, L'0');
+    std::copy(key.c_str(), key.c_str() + key.length(), padded + zeros);
+    return ACE_WString(padded, kBrandKeyWidth);
 }
 
 // An edit record: { "state": state, "value": { "item": text } }.
@@ -568,46 +574,57 @@ void ToolConfigurationCommand::createDataForCombo(const ACE_WString& name)
     if (!m_dataManager.isAvailable() || m_pWorkshopInfoUpdater == nullptr)
         return;
 
-    // The brand table read in place: keys padded for sorting, and the default labels.
+    // The brand table read in place. A key of the full width is its own padded key, and only
+    // its value can be a default label: the one of the item with that padded key.
     struct Brand
     {
-        std::wstring padded;
-        ACE_WString defaultLabel;
+        ACE_WString padded;
+        bool ownPadded;
+        ACE_WString value;
     };
+    int count = 0;
+    m_dataManager->visitValues(ID(kBrandsUri), [&count](const ACE_WString&, const BData&) { ++count; });
     std::vector<Brand> brands;
-    std::vector<std::pair<std::wstring, size_t>> byKey;
-    m_dataManager->visitValues(ID(kBrandsUri), [&](const ACE_WString& key, const BData& value) {
-        byKey.emplace_back(WideString::toStd(key), brands.size());
-        brands.push_back({WideString::toStd(padBrandKey(key)),
-                          value.type() == BData::eSTRING ? static_cast<const BString&>(value).value() : ACE_WString()});
+    brands.reserve(static_cast<size_t>(count));
+    m_dataManager->visitValues(ID(kBrandsUri), [&brands](const ACE_WString& key, const BData& value) {
+        const bool ownPadded = key.length() >= kBrandKeyWidth;
+        brands.push_back({ownPadded ? key : padBrandKey(key), ownPadded,
+                          ownPadded && value.type() == BData::eSTRING ? static_cast<const BString&>(value).value()
+                                                                      : ACE_WString()});
     });
 
     SmartProxy<PBText> bText;
     if (!bText.acquire(ID(kBTextID)))
         return;
 
-    // A brand's default label is the table's value under its padded key.
-    std::sort(byKey.begin(), byKey.end());
-    const auto defaultLabelOf = [&](const std::wstring& padded) {
-        const auto it = std::lower_bound(byKey.begin(), byKey.end(), std::make_pair(padded, size_t(0)));
-        return it != byKey.end() && it->first == padded ? brands[it->second].defaultLabel : ACE_WString();
+    // Items in the order of their padded keys; the table is usually in that order already.
+    const auto text = [&brands](size_t index) {
+        return std::wstring_view(brands[index].padded.c_str(), brands[index].padded.length());
     };
-    std::vector<std::wstring> paddedKeys;
-    paddedKeys.reserve(brands.size());
-    for (const Brand& brand : brands)
-        paddedKeys.push_back(brand.padded);
-    std::sort(paddedKeys.begin(), paddedKeys.end());
+    std::vector<size_t> order(brands.size());
+    std::iota(order.begin(), order.end(), size_t(0));
+    const auto byPaddedKey = [&text](size_t a, size_t b) { return text(a) < text(b); };
+    if (!std::is_sorted(order.begin(), order.end(), byPaddedKey))
+        std::sort(order.begin(), order.end(), byPaddedKey);
 
-    auto items = std::make_unique<BSet>(static_cast<int>(paddedKeys.size()));
+    auto items = std::make_unique<BSet>(static_cast<int>(brands.size()));
     ACE_WString firstLabel;
-    for (size_t i = 0; i < paddedKeys.size(); ++i)
+    for (size_t first = 0; first < order.size();)
     {
-        const ACE_WString paddedKey = WideString::fromStd(paddedKeys[i]);
-        const int number = StringUtilities::toInt(paddedKey.c_str());
-        auto label = std::make_unique<BString>(bText->getText(number, defaultLabelOf(paddedKeys[i])));
-        if (i == 0)
+        // Keys that pad alike ("7", "07", "0007") make one item.
+        size_t end = first + 1;
+        while (end < order.size() && text(order[end]) == text(order[first]))
+            ++end;
+        ACE_WString defaultLabel;
+        for (size_t i = first; i < end; ++i)
+            if (brands[order[i]].ownPadded)
+                defaultLabel = brands[order[i]].value;
+        const ACE_WString& paddedKey = brands[order[first]].padded;
+        auto label = std::make_unique<BString>(bText->getText(StringUtilities::toInt(paddedKey.c_str()), defaultLabel));
+        if (first == 0)
             firstLabel = label->value();
         items->put(paddedKey, std::move(label));
+        first = end;
     }
 
     BSet record(10);
@@ -615,7 +632,7 @@ void ToolConfigurationCommand::createDataForCombo(const ACE_WString& name)
     record.put(L"value", std::move(items));
 
     ACE_WString selected = m_pWorkshopInfoUpdater->getDefaultBrand();
-    if (selected.is_empty() && !paddedKeys.empty())
+    if (selected.is_empty() && !brands.empty())
         selected = firstLabel;
     record.set(L"selected", BString(selected));
     m_pWorkshopInfoUpdater->setDefaultBrand(selected);
