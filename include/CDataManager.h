@@ -22,6 +22,7 @@ public:
         eWRONG_TYPE = 3
     };
     using Listener = std::function<void(const ID& uri)>;
+    using ValueVisitor = std::function<void(const ACE_WString& key, const BData& value)>;
 
     static const wchar_t* const componentID;
 
@@ -34,6 +35,9 @@ public:
     int createData(const ID& uri, const BData& value);
     int setData(const ID& uri, const BData& value);
     int getData(const ID& uri, BData& value) const;
+    // Calls `visit` for each value (not nested set) directly in the set at `uri`, in order,
+    // without copying them. Runs under the data manager's lock: `visit` must not call it.
+    int visitValues(const ID& uri, const ValueVisitor& visit) const;
     int setBool(const ID& uri, bool value);
     int getBool(const ID& uri, bool& value) const;
     int setString(const ID& uri, const ACE_WString& value);

@@ -3,6 +3,7 @@
 #include "ProxyComponent.h"
 
 #include <atomic>
+#include <functional>
 
 class BData;
 class CDataManager;
@@ -19,6 +20,7 @@ public:
 
     int setData(const ID& uri, const BData& value);
     int getData(const ID& uri, BData& value);
+    int visitValues(const ID& uri, const std::function<void(const ACE_WString& key, const BData& value)>& visit);
     int setBool(const ID& uri, bool value);
     int setString(const ID& uri, const ACE_WString& value);
     int getString(const ID& uri, ACE_WString& value);

@@ -53,6 +53,9 @@ public:
     // errors. Sinks always receive every line.
     static void setLevel_static(int level);
     static int getLevel_static();
+    // Whether a line of `level` would be written anywhere (the file or a sink). The entry
+    // points check this first: a line nobody records is neither formatted nor written.
+    static bool isRecorded_static(int level);
 
     // Appends lines to `path` (UTF-8); an empty path stops file logging.
     static bool setLogFile(const ACE_WString& path);

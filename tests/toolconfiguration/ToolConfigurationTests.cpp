@@ -536,4 +536,93 @@ TEST_F(CommitTest, AFailedWorkshopSaveStillSavesTheOtherFilesAndCloses)
     EXPECT_TRUE(taskExists());
     EXPECT_EQ(m_mediator->closeCount(), 1);
 }
+
+// The users list is published once by Cancel and once by a change of the users file.
+TEST_F(Publication, CancelAndAChangedUsersFilePublishTheUsersOnce)
+{
+    ToolConfigurationCommand& command = makeCommand();
+    ASSERT_TRUE(command.init());
+    int userSetWrites = 0;
+    const int listener =
+        m_dataManager->addListener([&userSetWrites](const ID& uri) { userSetWrites += uri == ID(Uri::kUserSet); });
+    command.onCancelButtonClicked();
+    EXPECT_EQ(userSetWrites, 1);
+    EXPECT_EQ(BEvent<CustomEvent>::post(ToolConfigurationCommand::m_ID, CustomEvent(668, wide(m_usersPath))), 1);
+    EXPECT_EQ(userSetWrites, 2);
+    m_dataManager->removeListener(listener);
+    EXPECT_EQ(publishedUsers(*m_dataManager), (std::vector<User>{kAnna, kBruno, kClara}));
+}
+
+struct OwnSaveCase
+{
+    const char* label;
+    char file; // 'w'orkshop, 'u'sers, 'p'reparateur
+};
+
+class OwnSave : public ToolConfigurationTest, public ::testing::WithParamInterface<OwnSaveCase> {};
+
+// The watcher's reports of OK's own save leave the dialog as it is; an outside edit of the same
+// file rebuilds it, and so does a later return to the saved content.
+TEST_P(OwnSave, ReportOfOwnSaveRebuildsNothingWhileAnOutsideEditDoes)
+{
+    const OwnSaveCase& c = GetParam();
+    const std::string path = c.file == 'w' ? m_workshopPath : c.file == 'u' ? m_usersPath : m_updatePath;
+    ToolConfigurationCommand& command = makeCommand();
+    ASSERT_TRUE(command.init());
+    command.onOKButtonClicked();
+    const std::string saved = TempDir::read(path);
+    int writes = 0;
+    const int listener = m_dataManager->addListener([&writes](const ID&) { ++writes; });
+    const auto report = [&] {
+        writes = 0;
+        EXPECT_EQ(BEvent<CustomEvent>::post(ToolConfigurationCommand::m_ID, CustomEvent(668, wide(path))), 1);
+        return writes;
+    };
+    EXPECT_EQ(report(), 0);
+    EXPECT_EQ(report(), 0) << "a second report of the same save";
+
+    if (c.file == 'w')
+        SettingsFiles::writeWorkshop(path, {{"nom", "Renamed"}});
+    else if (c.file == 'u')
+        SettingsFiles::writeUsers(path, {kLukasz});
+    else
+        SettingsFiles::writeUpdate(path, SettingsFiles::Update{true, "OTHER", "/srv/other", "/var/repo", "09:15:00"});
+    EXPECT_GT(report(), 0);
+    if (c.file == 'w') { EXPECT_EQ(shown("NameEdit"), "3|Renamed"); }
+    TempDir::write(path, saved);
+    EXPECT_GT(report(), 0) << "back to the saved content, but not by the dialog";
+    m_dataManager->removeListener(listener);
+}
+
+INSTANTIATE_TEST_SUITE_P(Files, OwnSave,
+                         ::testing::Values(OwnSaveCase{"Workshop", 'w'}, OwnSaveCase{"Users", 'u'},
+                                           OwnSaveCase{"Update", 'p'}),
+                         [](const auto& info) { return std::string(info.param.label); });
+
+// Brand items are keyed by the padded brand key, in its order; a brand without a text shows the
+// value under its padded key, and keys that pad alike make one item.
+TEST_F(Publication, BrandItemsArePaddedSortedAndMergedWithTheirDefaultLabels)
+{
+    BSet brands(10);
+    brands.setString(L"12"_w, L"Twelve"_w);
+    brands.setString(L"7"_w, L"Seven"_w);
+    brands.setString(L"0007"_w, L"Zero seven"_w);
+    brands.setString(L"2"_w, L"Two"_w);
+    ASSERT_EQ(m_dataManager->createData(ID(Uri::kBrands), brands), 0);
+    makeCommand();
+    const BSet combo = record("BrandCombo");
+    BSet items;
+    ASSERT_EQ(combo.getSet(L"value"_w, items), 0);
+    std::string shownItems;
+    for (int i = 0; i < items.size(); ++i)
+    {
+        ACE_WString label;
+        items.getString(items.keyAt(i), label);
+        shownItems += utf8(items.keyAt(i)) + "=" + utf8(label) + " ";
+    }
+    EXPECT_EQ(shownItems, "0002=Marque B 0007=Zero seven 0012= ");
+    ACE_WString selected;
+    combo.getString(L"selected"_w, selected);
+    EXPECT_EQ(utf8(selected), "Marque B");
+}
 }

@@ -16,6 +16,27 @@ namespace
 const char* const kComponent = "tesselComponents";
 const char* const kFile = "tesselComponents.dll";
 const char* const kClass = "CBText";
+
+// A number's decimal text, as std::to_wstring writes it, without the C library's formatting.
+std::wstring decimal(int number)
+{
+    const long long value = number;
+    unsigned long long magnitude = value < 0 ? static_cast<unsigned long long>(-value) : value;
+    wchar_t digits[24];
+    size_t count = 0;
+    do
+    {
+        digits[count++] = static_cast<wchar_t>(L'0' + magnitude % 10);
+        magnitude /= 10;
+    } while (magnitude != 0);
+    std::wstring text;
+    text.reserve(count + 1);
+    if (value < 0)
+        text += L'-';
+    while (count > 0)
+        text += digits[--count];
+    return text;
+}
 }
 
 struct CBText::Impl
@@ -88,5 +109,5 @@ ACE_WString CBText::getText(const ACE_WString& textId, const ACE_WString& defaul
 
 ACE_WString CBText::getText(int textId, const ACE_WString& defaultText) const
 {
-    return m_impl->lookup(std::to_wstring(textId), defaultText);
+    return m_impl->lookup(decimal(textId), defaultText);
 }

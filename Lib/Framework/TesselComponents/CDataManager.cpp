@@ -80,9 +80,9 @@ void fillSet(const Node& node, BSet& set)
     {
         if (child->isSet())
         {
-            BSet inner;
-            fillSet(*child, inner);
-            set.setSet(name, inner);
+            auto inner = std::make_unique<BSet>();
+            fillSet(*child, *inner);
+            set.put(name, std::move(inner));
         }
         else
         {
@@ -267,6 +267,26 @@ int CDataManager::getData(const ID& uri, BData& value) const
     BSet set;
     fillSet(*node, set);
     static_cast<BSet&>(value) = std::move(set);
+    return eOK;
+}
+
+int CDataManager::visitValues(const ID& uri, const ValueVisitor& visit) const
+{
+    if (!isDataUri(uri))
+    {
+        logNotDataUri("visitValues", uri);
+        return eNOT_A_DATA_URI;
+    }
+    const std::vector<ACE_WString> segments = segmentsOf(uri);
+    std::lock_guard<std::mutex> lock(m_impl->mutex);
+    const Node* node = m_impl->find(segments);
+    if (node == nullptr)
+        return eNO_SUCH_DATA;
+    if (!node->isSet())
+        return eWRONG_TYPE;
+    for (const auto& [name, child] : node->children)
+        if (!child->isSet())
+            visit(name, *child->value);
     return eOK;
 }
 

@@ -28,6 +28,13 @@ int PDataManager::getData(const ID& uri, BData& value)
     return component != nullptr ? component->getData(uri, value) : CDataManager::eNO_SUCH_DATA;
 }
 
+int PDataManager::visitValues(const ID& uri,
+                              const std::function<void(const ACE_WString& key, const BData& value)>& visit)
+{
+    CDataManager* component = m_pComp.load();
+    return component != nullptr ? component->visitValues(uri, visit) : CDataManager::eNO_SUCH_DATA;
+}
+
 int PDataManager::setBool(const ID& uri, bool value)
 {
     CDataManager* component = m_pComp.load();

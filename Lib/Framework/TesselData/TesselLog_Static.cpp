@@ -35,7 +35,10 @@ struct LoggerState
 {
     std::mutex mutex;
     std::condition_variable callsDone;
-    int level = 10;
+    // Written under the mutex, read without it so an unrecorded line costs no lock.
+    std::atomic<int> level{10};
+    std::atomic<bool> hasFile{false};
+    std::atomic<int> sinkCount{0};
     ACE_WString path;
     std::unique_ptr<std::FILE, FileCloser> file;
     std::vector<std::shared_ptr<SinkEntry>> sinks;
@@ -133,6 +136,7 @@ void dispatch(int level, int code, const char* component, const char* file, cons
         if (s.file && passesVerbosity(s.level, level))
         {
             const std::string line = formatLine(record);
+            // One write per recorded line: a crash loses nothing that was logged before it.
             std::fwrite(line.data(), 1, line.size(), s.file.get());
             std::fflush(s.file.get());
         }
@@ -169,6 +173,13 @@ void dispatch(int level, int code, const char* component, const char* file, cons
     }
 }
 
+// Whether a line of `level` goes anywhere: the file at the current verbosity, or a sink.
+bool recorded(int level)
+{
+    const LoggerState& s = state();
+    return s.sinkCount.load() > 0 || (s.hasFile.load() && passesVerbosity(s.level.load(), level));
+}
+
 ACE_WString messageText(const wchar_t* message)
 {
     return message != nullptr ? ACE_WString(message) : ACE_WString(L"(null)");
@@ -178,24 +189,32 @@ ACE_WString messageText(const wchar_t* message)
 void TesselLog_Static::logTrace_static(const char* component, const char* file, const char* className,
                                        const wchar_t* message)
 {
+    if (!recorded(eTRACE))
+        return;
     dispatch(eTRACE, 0, component, file, className, messageText(message));
 }
 
 void TesselLog_Static::logInformation_static(const char* component, const char* file, const char* className,
                                              const wchar_t* message)
 {
+    if (!recorded(eINFORMATION))
+        return;
     dispatch(eINFORMATION, 0, component, file, className, messageText(message));
 }
 
 void TesselLog_Static::logWarning_static(const char* component, const char* file, const char* className,
                                          const wchar_t* message)
 {
+    if (!recorded(eWARNING))
+        return;
     dispatch(eWARNING, 0, component, file, className, messageText(message));
 }
 
 void TesselLog_Static::logError_static(const char* component, const char* file, const char* className, int code,
                                        const char* format, ...)
 {
+    if (!recorded(eERROR))
+        return;
     va_list args;
     va_start(args, format);
     ACE_WString message = StringUtilities::narrowVsprintf(format, args);
@@ -206,6 +225,8 @@ void TesselLog_Static::logError_static(const char* component, const char* file, 
 void TesselLog_Static::logError_static(const char* component, const char* file, const char* className, int code,
                                        const wchar_t* format, ...)
 {
+    if (!recorded(eERROR))
+        return;
     va_list args;
     va_start(args, format);
     ACE_WString message = StringUtilities::wideVsprintf(format, args);
@@ -216,6 +237,8 @@ void TesselLog_Static::logError_static(const char* component, const char* file, 
 void TesselLog_Static::log_static(int level, int code, const char* component, const char* file,
                                   const char* className, const wchar_t* format, ...)
 {
+    if (!recorded(level))
+        return;
     va_list args;
     va_start(args, format);
     ACE_WString message = StringUtilities::wideVsprintf(format, args);
@@ -232,9 +255,12 @@ void TesselLog_Static::setLevel_static(int level)
 
 int TesselLog_Static::getLevel_static()
 {
-    LoggerState& s = state();
-    std::lock_guard<std::mutex> lock(s.mutex);
-    return s.level;
+    return state().level.load();
+}
+
+bool TesselLog_Static::isRecorded_static(int level)
+{
+    return recorded(level);
 }
 
 bool TesselLog_Static::setLogFile(const ACE_WString& path)
@@ -249,6 +275,7 @@ bool TesselLog_Static::setLogFile(const ACE_WString& path)
     }
     std::lock_guard<std::mutex> lock(s.mutex);
     s.file = std::move(opened);
+    s.hasFile.store(s.file != nullptr);
     s.path = path;
     return true;
 }
@@ -270,6 +297,7 @@ int TesselLog_Static::addSink(Sink sink)
     std::lock_guard<std::mutex> lock(s.mutex);
     entry->handle = s.nextHandle++;
     s.sinks.push_back(entry);
+    s.sinkCount.store(static_cast<int>(s.sinks.size()));
     return entry->handle;
 }
 
@@ -283,6 +311,7 @@ void TesselLog_Static::removeSink(int handle)
         return;
     std::shared_ptr<SinkEntry> entry = *it;
     s.sinks.erase(it);
+    s.sinkCount.store(static_cast<int>(s.sinks.size()));
     entry->removed.store(true);
     // Once removed, the sink is not called any more: wait for calls running on other threads.
     const auto ownCalls = static_cast<int>(std::count(t_held.begin(), t_held.end(), entry.get()));

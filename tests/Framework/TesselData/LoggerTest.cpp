@@ -5,6 +5,7 @@
 #include <gtest/gtest.h>
 
 #include <atomic>
+#include <memory>
 #include <regex>
 #include <thread>
 
@@ -86,5 +87,43 @@ TEST(Logger, RemovedSinkIsNeverCalledAgainWhileOthersLog)
     stop = true;
     writer.join();
     EXPECT_EQ(failures, 0);
+}
+
+// The entry points drop a line before formatting it when neither the file (at its verbosity)
+// nor a sink takes it.
+TEST(Logger, LineIsRecordedOnlyWhenTheFileOrASinkTakesIt)
+{
+    TempDir dir;
+    const std::string path = dir.file("levels.log");
+    struct Case
+    {
+        bool file;
+        bool sink;
+        int verbosity;
+        int level;
+        bool recorded;
+    };
+    const Case cases[] = {
+        {false, false, 10, TesselLog_Static::eERROR, false}, {true, false, 10, TesselLog_Static::eTRACE, true},
+        {true, false, 0, TesselLog_Static::eTRACE, false},   {true, false, 0, TesselLog_Static::eINFORMATION, false},
+        {true, false, 0, TesselLog_Static::eWARNING, true},  {true, false, 0, TesselLog_Static::eERROR, true},
+        {false, true, 0, TesselLog_Static::eTRACE, true},    {true, true, 0, TesselLog_Static::eTRACE, true},
+    };
+    for (const Case& c : cases)
+    {
+        ASSERT_TRUE(TesselLog_Static::setLogFile(c.file ? wide(path) : ACE_WString()));
+        TesselLog_Static::setLevel_static(c.verbosity);
+        std::unique_ptr<LogCapture> capture = c.sink ? std::make_unique<LogCapture>() : nullptr;
+        EXPECT_EQ(TesselLog_Static::isRecorded_static(c.level), c.recorded)
+            << c.file << c.sink << " verbosity " << c.verbosity << " level " << c.level;
+    }
+    TesselLog_Static::setLevel_static(0);
+    ASSERT_TRUE(TesselLog_Static::setLogFile(wide(path)));
+    const std::string before = TempDir::read(path);
+    TesselLog_Static::log_static(TesselLog_Static::eTRACE, 0, "c", "f", "k", L"dropped %d", 1);
+    TesselLog_Static::logTrace_static("c", "f", "k", L"dropped");
+    EXPECT_EQ(TempDir::read(path), before);
+    ASSERT_TRUE(TesselLog_Static::setLogFile(ACE_WString()));
+    TesselLog_Static::setLevel_static(10);
 }
 }

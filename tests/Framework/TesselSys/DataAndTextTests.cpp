@@ -58,6 +58,34 @@ TEST_F(DataManagerTest, FailedAccessGivesItsCodeAndLeavesThePresetOutputAlsoThro
     EXPECT_TRUE(text == L"preset"_w && !flag && set.contains(L"preset"_w) && number.value() == 5);
 }
 
+// Visiting reads the values of one set in place, in order; nested sets are not values.
+TEST_F(DataManagerTest, VisitingASetSeesItsValuesInOrderAndFailsLikeAReadOtherwise)
+{
+    BSet brands;
+    brands.setString(L"7"_w, L"Seven"_w);
+    brands.setSet(L"inner"_w, BSet());
+    brands.setInt(L"1"_w, 1);
+    publish("data:/Brands", brands);
+    SmartProxy<PDataManager> dm;
+    ASSERT_TRUE(dm.acquire(ID(CDataManager::componentID)));
+    const auto visited = [&dm](const char* uri, std::string& seen) {
+        return dm->visitValues(ID(uri), [&seen](const ACE_WString& key, const BData& value) {
+            seen += utf8(key) + (value.type() == BData::eSTRING ? "=" + utf8(static_cast<const BString&>(value).value())
+                                                                : std::string("#")) + " ";
+        });
+    };
+    std::string seen;
+    EXPECT_EQ(visited("data:/Brands", seen), 0);
+    EXPECT_EQ(seen, "7=Seven 1# ");
+    seen.clear();
+    EXPECT_EQ(visited("data:/Brands/7", seen), CDataManager::eWRONG_TYPE);
+    EXPECT_EQ(visited("data:/Nothing", seen), CDataManager::eNO_SUCH_DATA);
+    EXPECT_EQ(visited("tessel:DM?DataManager", seen), CDataManager::eNOT_A_DATA_URI);
+    EXPECT_EQ(seen, "");
+    ASSERT_EQ(destroyDataManager(), 0);
+    EXPECT_EQ(visited("data:/Brands", seen), CDataManager::eNO_SUCH_DATA);
+}
+
 TEST_F(DataManagerTest, WritesAndPreloadReplaceAndInnerNodesReadAsTheSetBelowThem)
 {
     EXPECT_EQ(m_dataManager->setData(ID("data:/Auto/Menu/Name"), BString(L"x"_w)), CDataManager::eNO_SUCH_DATA);
@@ -164,6 +192,13 @@ TEST_F(ComponentFixture, TextsComeFromTheCatalogueOrAreExactlyTheDefault)
                   utf8(m_text->getText(985, L" d "_w)) + "|" + utf8(m_text->getText(4531, L""_w)) + "|" +
                   utf8(m_text->getText(L"brand_a"_w, L"d"_w)),
               "Ajouter|Marque \u00e9| d ||d");
+
+    // A number names the text of its decimal form, sign and all.
+    for (const int number : {0, 7, -42, 2147483647, -2147483647 - 1})
+    {
+        m_text->setText(wide(std::to_string(number)), wide("n" + std::to_string(number)));
+        EXPECT_EQ(utf8(m_text->getText(number, L"d"_w)), "n" + std::to_string(number));
+    }
 
     SmartProxy<PBText> proxy; // the proxy answers the default once the component is gone
     ASSERT_TRUE(proxy.acquire(ID(CBText::componentID)));

@@ -1,11 +1,11 @@
 #include "WorkshopInfoUpdater.h"
 
+#include "BString.h"
 #include "CWin32FileUtilities.h"
 #include "ID.h"
 #include "PBText.h"
 #include "PDataManager.h"
 #include "SmartProxy.h"
-#include "StringSet.h"
 #include "StringUtilities.h"
 #include "TesselLog_Static.h"
 #include "Win32File.h"
@@ -38,31 +38,54 @@ void warn(const ACE_WString& message)
     TesselLog_Static::logWarning_static(kComponent, kFile, kClass, message.c_str());
 }
 
-// The text component, the data manager and the brand table they serve, for one call.
+// The text component and the data manager's brand table, read in place, for one call.
 class BrandLookup
 {
 public:
-    BrandLookup() : m_brands(10)
+    BrandLookup()
     {
         m_available = m_text.acquire(ID(kTextComponentID)) && m_dataManager.acquire(ID(kDataManagerID));
-        if (m_available)
-        {
-            m_dataManager->getData(ID(kBrandsURI), m_brands);
-            m_keys = m_brands.getAllKeys();
-        }
     }
 
     bool isAvailable() const { return m_available; }
-    const BSet& brands() const { return m_brands; }
-    const StringSet& keys() const { return m_keys; }
+
+    bool contains(const ACE_WString& key)
+    {
+        bool found = false;
+        m_dataManager->visitValues(ID(kBrandsURI), [&](const ACE_WString& brand, const BData&) {
+            found = found || brand == key;
+        });
+        return found;
+    }
+
+    // The first brand whose text is `label`; without one, false and the first brand (if any).
+    bool keyOf(const ACE_WString& label, ACE_WString& key)
+    {
+        bool found = false;
+        bool first = true;
+        m_dataManager->visitValues(ID(kBrandsURI), [&](const ACE_WString& brand, const BData& value) {
+            if (found)
+                return;
+            if (first)
+                key = brand;
+            first = false;
+            const ACE_WString defaultName =
+                value.type() == BData::eSTRING ? static_cast<const BString&>(value).value() : ACE_WString();
+            if (text(StringUtilities::toInt(brand.c_str()), defaultName) == label)
+            {
+                key = brand;
+                found = true;
+            }
+        });
+        return found;
+    }
+
     ACE_WString text(int number, const ACE_WString& defaultText) { return m_text->getText(number, defaultText); }
 
 private:
     SmartProxy<PBText> m_text;
     SmartProxy<PDataManager> m_dataManager;
     bool m_available;
-    BSet m_brands;
-    StringSet m_keys;
 };
 }
 
@@ -297,7 +320,7 @@ const ACE_WString WorkshopInfoUpdater::getDefaultBrand()
         return ACE_WString();
     ACE_WString stored;
     m_content.getString(kDefaultBrand, stored);
-    if (stored.length() == 0 || !lookup.brands().contains(stored))
+    if (stored.length() == 0 || !lookup.contains(stored))
         return ACE_WString();
     const int number = StringUtilities::toInt(stored.c_str());
     if (number == 0)
@@ -315,21 +338,8 @@ bool WorkshopInfoUpdater::setDefaultBrand(const ACE_WString& brandName)
     BrandLookup lookup;
     if (!lookup.isAvailable())
         return false;
-    const StringSet& keys = lookup.keys();
-    for (int i = 0; i < keys.length(); ++i)
-    {
-        ACE_WString key;
-        keys.getAt(i, key);
-        ACE_WString defaultName;
-        lookup.brands().getString(key, defaultName);
-        if (lookup.text(StringUtilities::toInt(key.c_str()), defaultName) == brandName)
-        {
-            m_content.setString(kDefaultBrand, key);
-            return true;
-        }
-    }
-    ACE_WString first;
-    keys.getAt(0, first);
-    m_content.setString(kDefaultBrand, first);
-    return false;
+    ACE_WString key;
+    const bool found = lookup.keyOf(brandName, key);
+    m_content.setString(kDefaultBrand, key);
+    return found;
 }

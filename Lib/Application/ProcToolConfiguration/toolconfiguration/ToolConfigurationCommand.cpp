@@ -16,6 +16,7 @@
 #include "OnLineUpdateCommand.h"
 #include "PMediator.h"
 #include "UsersUpdater.h"
+#include "WideString.h"
 #include "WorkshopInfoUpdater.h"
 
 #include <ace/Guard_T.h>
@@ -25,7 +26,9 @@
 
 #include <algorithm>
 #include <memory>
+#include <numeric>
 #include <string>
+#include <string_view>
 #include <vector>
 
 namespace
@@ -117,13 +120,17 @@ QString chooseDirectory()
 }
 
 // The brand number right-justified to four characters with '0'; longer keys stay as they are.
+const size_t kBrandKeyWidth = 4;
+
 ACE_WString padBrandKey(const ACE_WString& key)
 {
-    ACE_WString padded;
-    for (size_t i = key.length(); i < 4; ++i)
-        padded += L'0';
-    padded += key;
-    return padded;
+    if (key.length() >= kBrandKeyWidth)
+        return key;
+    wchar_t padded[kBrandKeyWidth];
+    const size_t zeros = kBrandKeyWidth - key.length();
+    std::fill(padded, padded + zeros, L'0');
+    std::copy(key.c_str(), key.c_str() + key.length(), padded + zeros);
+    return ACE_WString(padded, kBrandKeyWidth);
 }
 
 // An edit record: { "state": state, "value": { "item": text } }.
@@ -164,7 +171,8 @@ ToolConfigurationCommand::ToolConfigurationCommand(const QString& commandID)
       m_app2AppIP(),
       m_app2AppValues(10),
       m_storesMutex(),
-      m_fileSystemWatcher()
+      m_fileSystemWatcher(),
+      m_ownSaves()
 {
     m_dataManager.acquire(ID(kDataManagerID));
     m_fileSystemWatcher.acquire(ID(kWatcherID));
@@ -264,6 +272,12 @@ void ToolConfigurationCommand::handleEvent(const CustomEvent& event)
     if (updatePath.is_empty())
         updatePath = kUpdateFileDefault;
 
+    const bool watched = changedPath == workshopPath || changedPath == usersPath || changedPath == updatePath;
+    if (watched && m_ownSaves.isOwnSave(WideString::toUtf8(changedPath)))
+    {
+        trace(L"[ToolConfigurationCommand::handleEvent(CustomEvent)]: Our own save, nothing to rebuild.");
+        return;
+    }
     if (changedPath == workshopPath)
     {
         createDMData(false);
@@ -281,8 +295,8 @@ void ToolConfigurationCommand::handleEvent(const CustomEvent& event)
 
 void ToolConfigurationCommand::refreshUsersListData()
 {
-    UsersCommand usersCommand(QString("WC_USERSCOMMAND"));
-    usersCommand.createDMUsersData();
+    // The users command publishes the list when it is made.
+    const UsersCommand usersCommand(QString("WC_USERSCOMMAND"));
 }
 
 void ToolConfigurationCommand::createDMData(bool reset)
@@ -560,44 +574,65 @@ void ToolConfigurationCommand::createDataForCombo(const ACE_WString& name)
     if (!m_dataManager.isAvailable() || m_pWorkshopInfoUpdater == nullptr)
         return;
 
-    BSet brands(10);
-    m_dataManager->getData(ID(kBrandsUri), brands);
+    // The brand table read in place. A key of the full width is its own padded key, and only
+    // its value can be a default label: the one of the item with that padded key.
+    struct Brand
+    {
+        ACE_WString padded;
+        bool ownPadded;
+        ACE_WString value;
+    };
+    int count = 0;
+    m_dataManager->visitValues(ID(kBrandsUri), [&count](const ACE_WString&, const BData&) { ++count; });
+    std::vector<Brand> brands;
+    brands.reserve(static_cast<size_t>(count));
+    m_dataManager->visitValues(ID(kBrandsUri), [&brands](const ACE_WString& key, const BData& value) {
+        const bool ownPadded = key.length() >= kBrandKeyWidth;
+        brands.push_back({ownPadded ? key : padBrandKey(key), ownPadded,
+                          ownPadded && value.type() == BData::eSTRING ? static_cast<const BString&>(value).value()
+                                                                      : ACE_WString()});
+    });
 
     SmartProxy<PBText> bText;
     if (!bText.acquire(ID(kBTextID)))
         return;
 
-    const StringSet keys = brands.getAllKeys();
-    std::vector<std::wstring> paddedKeys;
-    for (int i = 0; i < keys.length(); ++i)
-    {
-        ACE_WString key;
-        keys.getAt(i, key);
-        const ACE_WString padded = padBrandKey(key);
-        paddedKeys.emplace_back(padded.c_str(), padded.length());
-    }
-    std::sort(paddedKeys.begin(), paddedKeys.end());
+    // Items in the order of their padded keys; the table is usually in that order already.
+    const auto text = [&brands](size_t index) {
+        return std::wstring_view(brands[index].padded.c_str(), brands[index].padded.length());
+    };
+    std::vector<size_t> order(brands.size());
+    std::iota(order.begin(), order.end(), size_t(0));
+    const auto byPaddedKey = [&text](size_t a, size_t b) { return text(a) < text(b); };
+    if (!std::is_sorted(order.begin(), order.end(), byPaddedKey))
+        std::sort(order.begin(), order.end(), byPaddedKey);
 
-    BSet items(10);
+    auto items = std::make_unique<BSet>(static_cast<int>(brands.size()));
     ACE_WString firstLabel;
-    for (size_t i = 0; i < paddedKeys.size(); ++i)
+    for (size_t first = 0; first < order.size();)
     {
-        const ACE_WString paddedKey(paddedKeys[i].c_str(), paddedKeys[i].size());
-        const int number = StringUtilities::toInt(paddedKey.c_str());
+        // Keys that pad alike ("7", "07", "0007") make one item.
+        size_t end = first + 1;
+        while (end < order.size() && text(order[end]) == text(order[first]))
+            ++end;
         ACE_WString defaultLabel;
-        brands.getString(paddedKey, defaultLabel);
-        const ACE_WString label = bText->getText(number, defaultLabel);
-        items.set(paddedKey, BString(label));
-        if (i == 0)
-            firstLabel = label;
+        for (size_t i = first; i < end; ++i)
+            if (brands[order[i]].ownPadded)
+                defaultLabel = brands[order[i]].value;
+        const ACE_WString& paddedKey = brands[order[first]].padded;
+        auto label = std::make_unique<BString>(bText->getText(StringUtilities::toInt(paddedKey.c_str()), defaultLabel));
+        if (first == 0)
+            firstLabel = label->value();
+        items->put(paddedKey, std::move(label));
+        first = end;
     }
 
     BSet record(10);
-    record.set(L"state", BInt(kStateEditable));
-    record.set(L"value", items);
+    record.put(L"state", std::make_unique<BInt>(kStateEditable));
+    record.put(L"value", std::move(items));
 
     ACE_WString selected = m_pWorkshopInfoUpdater->getDefaultBrand();
-    if (selected.is_empty() && !paddedKeys.empty())
+    if (selected.is_empty() && !brands.empty())
         selected = firstLabel;
     record.set(L"selected", BString(selected));
     m_pWorkshopInfoUpdater->setDefaultBrand(selected);
@@ -797,6 +832,13 @@ void ToolConfigurationCommand::onOKButtonClicked()
     if (m_pUpdateUpdater != nullptr)
         saveOnlineUpdateAndTask();
 
+    ACE_WString updatePath = readPath(kUpdateFileDefault, kUpdateFileUri);
+    if (updatePath.is_empty())
+        updatePath = kUpdateFileDefault;
+    for (const ACE_WString& path : {readPath(kWorkshopFileDefault, kWorkshopFileUri),
+                                    readPath(kUsersFileDefault, kUsersFileUri), updatePath})
+        m_ownSaves.remember(WideString::toUtf8(path));
+
     SmartProxy<PMediator> mediator;
     if (mediator.acquire(ID(kMediatorID)))
         mediator->closeDialog();
@@ -809,11 +851,7 @@ void ToolConfigurationCommand::onCancelButtonClicked()
         mediator->closeDialog();
 
     createDMData(true);
-
-    {
-        UsersCommand usersCommand(QString("WC_USERSCOMMAND"));
-        usersCommand.createDMUsersData();
-    }
+    refreshUsersListData();
     mediator.giveBack();
 }
 

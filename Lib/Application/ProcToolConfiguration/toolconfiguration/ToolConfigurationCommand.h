@@ -5,6 +5,7 @@
 #include "Export.h"
 #include "HandlerCustomEvent.h"
 #include "ID.h"
+#include "OwnSaves.h"
 #include "PBText.h"
 #include "PDataManager.h"
 #include "PMessageBoxManager.h"
@@ -125,6 +126,8 @@ private:
     BSet m_app2AppValues;
     ACE_Thread_Mutex m_storesMutex;
     SmartProxy<PQ17FileSystemWatcher> m_fileSystemWatcher;
+    // What OK wrote, so the watcher's report of it is not taken for an outside edit.
+    OwnSaves m_ownSaves;
 
     // OK: the users and App2App part of the users file, then the online-update settings and
     // the scheduled task, each under the stores' lock.

@@ -15,6 +15,7 @@
 
 #include <QLineEdit>
 
+#include <memory>
 #include <string>
 
 namespace
@@ -134,11 +135,11 @@ void UsersCommand::createDMUsersData()
             const ACE_WString name = store.getUserName(slot);
             if (name.is_empty() || name == ACE_WString(L"0"))
                 continue;
-            BSet entry(10);
-            entry.set(L"name", BString(name));
-            entry.set(L"phone", BString(store.getUserPhone(slot)));
-            entry.set(L"address", BString(store.getUserAddress(slot)));
-            users.set(userKey(published++), entry);
+            auto entry = std::make_unique<BSet>(3);
+            entry->put(L"name", std::make_unique<BString>(name));
+            entry->put(L"phone", std::make_unique<BString>(store.getUserPhone(slot)));
+            entry->put(L"address", std::make_unique<BString>(store.getUserAddress(slot)));
+            users.put(userKey(published++), std::move(entry));
         }
     }
     m_dataManager->createData(ID(kUserSetUri), users);

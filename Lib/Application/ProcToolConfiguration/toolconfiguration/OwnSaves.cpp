@@ -1,0 +1,34 @@
+#include "OwnSaves.h"
+
+#include <fstream>
+#include <functional>
+#include <iterator>
+
+void OwnSaves::remember(const std::string& path)
+{
+    m_saved[path] = fingerprintOf(path);
+}
+
+bool OwnSaves::isOwnSave(const std::string& path)
+{
+    const auto it = m_saved.find(path);
+    if (it == m_saved.end())
+        return false;
+    if (it->second == fingerprintOf(path))
+        return true;
+    m_saved.erase(it);
+    return false;
+}
+
+OwnSaves::Fingerprint OwnSaves::fingerprintOf(const std::string& path)
+{
+    Fingerprint fingerprint;
+    std::ifstream in(path, std::ios::binary);
+    if (!in)
+        return fingerprint;
+    const std::string content((std::istreambuf_iterator<char>(in)), std::istreambuf_iterator<char>());
+    fingerprint.exists = !in.bad();
+    fingerprint.size = content.size();
+    fingerprint.hash = std::hash<std::string>()(content);
+    return fingerprint;
+}
