@@ -50,7 +50,7 @@ public:
                            const char* className, const wchar_t* format, ...);
 
     // Verbosity of the log file: 10 writes every line (recording mode), 0 only warnings and
-    // errors. Sinks always receive every line.
+    // errors. Sinks receive the lines of their own levels.
     static void setLevel_static(int level);
     static int getLevel_static();
     // Whether a line of `level` would be written anywhere (the file or a sink). The entry
@@ -61,8 +61,9 @@ public:
     static bool setLogFile(const ACE_WString& path);
     static ACE_WString getLogFile();
 
-    // Sinks see every record, on the thread that logs. Returns a handle for removeSink.
-    static int addSink(Sink sink);
+    // Sinks see every record of `minimumLevel` or above, on the thread that logs; lines below
+    // every sink's level and the file's are not even formatted. Returns a handle for removeSink.
+    static int addSink(Sink sink, int minimumLevel = eTRACE);
     static void removeSink(int handle);
 };
 

@@ -23,9 +23,7 @@ bool HostProblems::start()
 {
     if (m_sink != 0)
         return true;
-    m_sink = TesselLog_Static::addSink([this](const TesselLog_Static::Record& record) {
-        if (record.level < TesselLog_Static::eWARNING)
-            return;
+    auto take = [this](const TesselLog_Static::Record& record) {
         std::uint64_t serial = 0;
         {
             std::lock_guard<std::mutex> lock(m_mutex);
@@ -34,11 +32,12 @@ bool HostProblems::start()
         const bool error = record.level >= TesselLog_Static::eERROR;
         const QString text = QString::fromWCharArray(record.message.c_str(), static_cast<qsizetype>(record.message.length()));
         if (QThread::currentThread() == thread())
-            take(serial, error, text);
+            this->take(serial, error, text);
         else
-            QMetaObject::invokeMethod(this, [this, serial, error, text]() { take(serial, error, text); },
+            QMetaObject::invokeMethod(this, [this, serial, error, text]() { this->take(serial, error, text); },
                                       Qt::QueuedConnection);
-    });
+    };
+    m_sink = TesselLog_Static::addSink(take, TesselLog_Static::eWARNING);
     if (m_sink == 0)
         return false;
     return Register(ID(kHandlerID)) == 0;

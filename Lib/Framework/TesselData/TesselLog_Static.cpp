@@ -12,14 +12,18 @@
 #include <memory>
 #include <mutex>
 #include <new>
+#include <limits>
 #include <thread>
 #include <vector>
 
 namespace
 {
+constexpr int kNoSink = std::numeric_limits<int>::max();
+
 struct SinkEntry
 {
     int handle = 0;
+    int minimumLevel = 0;
     TesselLog_Static::Sink sink;
     int activeCalls = 0; // guarded by the logger's mutex
     std::atomic<bool> removed{false};
@@ -38,7 +42,8 @@ struct LoggerState
     // Written under the mutex, read without it so an unrecorded line costs no lock.
     std::atomic<int> level{10};
     std::atomic<bool> hasFile{false};
-    std::atomic<int> sinkCount{0};
+    // The lowest level any sink takes; above every level while there is none.
+    std::atomic<int> sinkMinimum{kNoSink};
     ACE_WString path;
     std::unique_ptr<std::FILE, FileCloser> file;
     std::vector<std::shared_ptr<SinkEntry>> sinks;
@@ -142,9 +147,11 @@ void dispatch(int level, int code, const char* component, const char* file, cons
         }
         if (t_depth < kMaxSinkNesting)
         {
-            sinks = s.sinks;
-            for (auto& entry : sinks)
+            for (const auto& entry : s.sinks)
             {
+                if (level < entry->minimumLevel)
+                    continue;
+                sinks.push_back(entry);
                 ++entry->activeCalls;
                 t_held.push_back(entry.get());
             }
@@ -173,11 +180,20 @@ void dispatch(int level, int code, const char* component, const char* file, cons
     }
 }
 
+// Under the logger's mutex, after the sinks changed.
+void updateSinkMinimum(LoggerState& s)
+{
+    int minimum = kNoSink;
+    for (const auto& entry : s.sinks)
+        minimum = std::min(minimum, entry->minimumLevel);
+    s.sinkMinimum.store(minimum);
+}
+
 // Whether a line of `level` goes anywhere: the file at the current verbosity, or a sink.
 bool recorded(int level)
 {
     const LoggerState& s = state();
-    return s.sinkCount.load() > 0 || (s.hasFile.load() && passesVerbosity(s.level.load(), level));
+    return level >= s.sinkMinimum.load() || (s.hasFile.load() && passesVerbosity(s.level.load(), level));
 }
 
 ACE_WString messageText(const wchar_t* message)
@@ -287,17 +303,18 @@ ACE_WString TesselLog_Static::getLogFile()
     return s.path;
 }
 
-int TesselLog_Static::addSink(Sink sink)
+int TesselLog_Static::addSink(Sink sink, int minimumLevel)
 {
     if (!sink)
         return 0;
     LoggerState& s = state();
     auto entry = std::make_shared<SinkEntry>();
     entry->sink = std::move(sink);
+    entry->minimumLevel = minimumLevel;
     std::lock_guard<std::mutex> lock(s.mutex);
     entry->handle = s.nextHandle++;
     s.sinks.push_back(entry);
-    s.sinkCount.store(static_cast<int>(s.sinks.size()));
+    updateSinkMinimum(s);
     return entry->handle;
 }
 
@@ -311,7 +328,7 @@ void TesselLog_Static::removeSink(int handle)
         return;
     std::shared_ptr<SinkEntry> entry = *it;
     s.sinks.erase(it);
-    s.sinkCount.store(static_cast<int>(s.sinks.size()));
+    updateSinkMinimum(s);
     entry->removed.store(true);
     // Once removed, the sink is not called any more: wait for calls running on other threads.
     const auto ownCalls = static_cast<int>(std::count(t_held.begin(), t_held.end(), entry.get()));

@@ -98,24 +98,32 @@ TEST(Logger, LineIsRecordedOnlyWhenTheFileOrASinkTakesIt)
     struct Case
     {
         bool file;
-        bool sink;
+        int sinkLevel; // 0: no sink
         int verbosity;
         int level;
         bool recorded;
     };
+    const int trace = TesselLog_Static::eTRACE, warning = TesselLog_Static::eWARNING;
     const Case cases[] = {
-        {false, false, 10, TesselLog_Static::eERROR, false}, {true, false, 10, TesselLog_Static::eTRACE, true},
-        {true, false, 0, TesselLog_Static::eTRACE, false},   {true, false, 0, TesselLog_Static::eINFORMATION, false},
-        {true, false, 0, TesselLog_Static::eWARNING, true},  {true, false, 0, TesselLog_Static::eERROR, true},
-        {false, true, 0, TesselLog_Static::eTRACE, true},    {true, true, 0, TesselLog_Static::eTRACE, true},
+        {false, 0, 10, TesselLog_Static::eERROR, false}, {true, 0, 10, trace, true},
+        {true, 0, 0, trace, false},                      {true, 0, 0, TesselLog_Static::eINFORMATION, false},
+        {true, 0, 0, warning, true},                     {true, 0, 0, TesselLog_Static::eERROR, true},
+        {false, trace, 0, trace, true},                  {true, trace, 0, trace, true},
+        {false, warning, 10, trace, false},              {false, warning, 0, warning, true},
     };
     for (const Case& c : cases)
     {
         ASSERT_TRUE(TesselLog_Static::setLogFile(c.file ? wide(path) : ACE_WString()));
         TesselLog_Static::setLevel_static(c.verbosity);
-        std::unique_ptr<LogCapture> capture = c.sink ? std::make_unique<LogCapture>() : nullptr;
+        int received = 0;
+        const int sink = c.sinkLevel == 0 ? 0
+                                          : TesselLog_Static::addSink(
+                                                [&received](const TesselLog_Static::Record&) { ++received; }, c.sinkLevel);
         EXPECT_EQ(TesselLog_Static::isRecorded_static(c.level), c.recorded)
-            << c.file << c.sink << " verbosity " << c.verbosity << " level " << c.level;
+            << c.file << c.sinkLevel << " verbosity " << c.verbosity << " level " << c.level;
+        TesselLog_Static::log_static(c.level, 0, "c", "f", "k", L"line");
+        EXPECT_EQ(received, c.sinkLevel != 0 && c.level >= c.sinkLevel ? 1 : 0) << "sink of level " << c.sinkLevel;
+        TesselLog_Static::removeSink(sink);
     }
     TesselLog_Static::setLevel_static(0);
     ASSERT_TRUE(TesselLog_Static::setLogFile(wide(path)));
