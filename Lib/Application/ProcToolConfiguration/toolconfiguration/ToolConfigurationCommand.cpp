@@ -29,6 +29,7 @@
 #include <numeric>
 #include <string>
 #include <string_view>
+#include <utility>
 #include <vector>
 
 namespace
@@ -636,7 +637,7 @@ void ToolConfigurationCommand::createDataForCombo(const ACE_WString& name)
         selected = firstLabel;
     record.set(L"selected", BString(selected));
     m_pWorkshopInfoUpdater->setDefaultBrand(selected);
-    m_dataManager->createData(controlUri(name), record);
+    m_dataManager->createData(controlUri(name), std::move(record));
 }
 
 void ToolConfigurationCommand::createDataForUpdateRadioButtons()

@@ -17,6 +17,7 @@
 
 #include <memory>
 #include <string>
+#include <utility>
 
 namespace
 {
@@ -142,7 +143,7 @@ void UsersCommand::createDMUsersData()
             users.put(userKey(published++), std::move(entry));
         }
     }
-    m_dataManager->createData(ID(kUserSetUri), users);
+    m_dataManager->createData(ID(kUserSetUri), std::move(users));
 }
 
 void UsersCommand::populateForbiddenList(const BSet& users, QStringList& names)
