@@ -7,6 +7,7 @@
 #include "TesselLog_Static.h"
 #include "WideString.h"
 
+#include <algorithm>
 #include <map>
 #include <mutex>
 #include <string>
@@ -141,6 +142,7 @@ std::vector<ACE_WString> segmentsOf(const ID& uri)
     const ACE_WString path = uri.getPath();
     const wchar_t* const text = path.c_str();
     const size_t length = path.length();
+    segments.reserve(static_cast<size_t>(std::count(text, text + length, L'/')) + 1);
     size_t start = 0;
     for (size_t i = 0; i <= length; ++i)
     {
