@@ -91,17 +91,7 @@ ID controlUri(const ACE_WString& name)
 // "User#<index>" for an index from 0.
 ACE_WString userKey(int index)
 {
-    wchar_t digits[16];
-    size_t start = sizeof(digits) / sizeof(digits[0]);
-    unsigned int value = static_cast<unsigned int>(index);
-    do
-    {
-        digits[--start] = static_cast<wchar_t>(L'0' + value % 10);
-        value /= 10;
-    } while (value != 0);
-    ACE_WString key(L"User#");
-    key += ACE_WString(digits + start, sizeof(digits) / sizeof(digits[0]) - start);
-    return key;
+    return StringUtilities::withNumber(L"User#", static_cast<unsigned int>(index));
 }
 
 ACE_WString toWide(const QString& text)
