@@ -4,6 +4,7 @@
 #include "StringSet.h"
 
 #include <cstddef>
+#include <functional>
 #include <memory>
 #include <string>
 #include <utility>
@@ -73,6 +74,8 @@ public:
     // and an empty string value.
     const ACE_WString& keyAt(int index) const;
     const BData& valueAt(int index) const;
+    // Hands every entry, in order, to `take` with its value, and leaves the set empty.
+    void drain(const std::function<void(const ACE_WString& key, std::unique_ptr<BData> value)>& take);
 
 private:
     friend class XmlSetCodec;

@@ -33,6 +33,8 @@ public:
     static CDataManager* registerWith(IComponentManager& manager);
 
     int createData(const ID& uri, const BData& value);
+    // The same, taking the set's values over instead of copying them; `value` is left empty.
+    int createData(const ID& uri, BSet&& value);
     int setData(const ID& uri, const BData& value);
     int getData(const ID& uri, BData& value) const;
     // Calls `visit` for each value (not nested set) directly in the set at `uri`, in order,

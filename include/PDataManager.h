@@ -6,6 +6,7 @@
 #include <functional>
 
 class BData;
+class BSet;
 class CDataManager;
 
 // Proxy of the data manager; every operation answers CDataManager's result codes, and
@@ -26,6 +27,7 @@ public:
     int getString(const ID& uri, ACE_WString& value);
     int getBool(const ID& uri, bool& value);
     int createData(const ID& uri, const BData& value);
+    int createData(const ID& uri, BSet&& value);
 
 private:
     std::atomic<CDataManager*> m_pComp;

@@ -123,7 +123,7 @@ TEST(SettingsFileTest, ReadsAndWritesShareOneSizeLimit)
     large.setString(L"nom"_w, wide(std::string(SettingsFile::kMaxSize, 'x')));
     LogCapture log;
     EXPECT_FALSE(large.save(wide(path), false));
-    EXPECT_TRUE(log.containsSubstring("larger than"));
+    EXPECT_TRUE(log.containsSubstring("content larger than 4194304 bytes"));
     EXPECT_EQ(TempDir::read(path), before);
 
     BSet fits(10);

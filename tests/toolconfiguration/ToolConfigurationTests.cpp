@@ -454,7 +454,10 @@ TEST_F(CommitTest, OkWritesThePublishedUsersInPlaceOfTheOldOnes)
     BSet published;
     const User noName{"", "no name", "0000"};  // not written
     const User clara{"Clara", "", ""};
-    for (const User& user : {kLukasz, noName, clara})
+    std::vector<User> users{kLukasz, noName, clara};
+    for (int n = 3; n < 12; ++n) // keys of two digits too
+        users.push_back({"User " + std::to_string(n), "", ""});
+    for (const User& user : users)
     {
         BSet entry;
         entry.setString(L"name"_w, wide(user.name));
@@ -464,7 +467,9 @@ TEST_F(CommitTest, OkWritesThePublishedUsersInPlaceOfTheOldOnes)
     }
     ASSERT_EQ(m_dataManager->createData(ID(Uri::kUserSet), published), 0);
     command.onOKButtonClicked();
-    EXPECT_EQ(SettingsFiles::usersIn(m_usersPath), (std::vector<User>{kLukasz, clara}));
+    std::vector<User> expected{kLukasz, clara};
+    expected.insert(expected.end(), users.begin() + 3, users.end());
+    EXPECT_EQ(SettingsFiles::usersIn(m_usersPath), expected);
 }
 
 TEST_F(CommitTest, App2AppEditsAreSavedOnOkWithTheAddressNormalisedAndShownAgainWhenChanged)

@@ -7,6 +7,7 @@
 #include "TesselLog_Static.h"
 #include "WideString.h"
 
+#include <algorithm>
 #include <map>
 #include <mutex>
 #include <string>
@@ -74,6 +75,30 @@ std::unique_ptr<Node> nodeFrom(const BData& data)
     return node;
 }
 
+std::unique_ptr<Node> nodeTaking(BSet& set);
+
+// The node of `data`, its values taken over; nested sets are emptied.
+std::unique_ptr<Node> nodeTaking(std::unique_ptr<BData> data)
+{
+    if (data->type() != BData::eSET)
+    {
+        auto node = std::make_unique<Node>();
+        node->value = std::move(data);
+        return node;
+    }
+    return nodeTaking(static_cast<BSet&>(*data));
+}
+
+std::unique_ptr<Node> nodeTaking(BSet& set)
+{
+    auto node = std::make_unique<Node>();
+    node->children.reserve(static_cast<size_t>(set.size()));
+    set.drain([&node](const ACE_WString& key, std::unique_ptr<BData> value) {
+        node->children.emplace_back(key, nodeTaking(std::move(value)));
+    });
+    return node;
+}
+
 void fillSet(const Node& node, BSet& set)
 {
     for (const auto& [name, child] : node.children)
@@ -114,16 +139,18 @@ bool isDataUri(const ID& uri)
 std::vector<ACE_WString> segmentsOf(const ID& uri)
 {
     std::vector<ACE_WString> segments;
-    const std::wstring path = WideString::toStd(uri.getPath());
-    std::wstring::size_type start = 0;
-    while (start <= path.size())
+    const ACE_WString path = uri.getPath();
+    const wchar_t* const text = path.c_str();
+    const size_t length = path.length();
+    segments.reserve(static_cast<size_t>(std::count(text, text + length, L'/')) + 1);
+    size_t start = 0;
+    for (size_t i = 0; i <= length; ++i)
     {
-        std::wstring::size_type end = path.find(L'/', start);
-        if (end == std::wstring::npos)
-            end = path.size();
-        if (end > start)
-            segments.push_back(WideString::fromStd(path.substr(start, end - start)));
-        start = end + 1;
+        if (i < length && text[i] != L'/')
+            continue;
+        if (i > start)
+            segments.emplace_back(text + start, i - start);
+        start = i + 1;
     }
     return segments;
 }
@@ -224,6 +251,24 @@ int CDataManager::createData(const ID& uri, const BData& value)
         std::lock_guard<std::mutex> lock(m_impl->mutex);
         Node* parent = m_impl->parentOf(segments, true);
         parent->slot(segments.back()) = nodeFrom(value);
+    }
+    m_impl->notify(uri);
+    return eOK;
+}
+
+int CDataManager::createData(const ID& uri, BSet&& value)
+{
+    const std::vector<ACE_WString> segments = segmentsOf(uri);
+    if (!isDataUri(uri) || segments.empty())
+    {
+        logNotDataUri("createData", uri);
+        return eNOT_A_DATA_URI;
+    }
+    std::unique_ptr<Node> node = nodeTaking(value);
+    {
+        std::lock_guard<std::mutex> lock(m_impl->mutex);
+        Node* parent = m_impl->parentOf(segments, true);
+        parent->slot(segments.back()) = std::move(node);
     }
     m_impl->notify(uri);
     return eOK;

@@ -2,6 +2,8 @@
 
 #include "CDataManager.h"
 
+#include <utility>
+
 PDataManager::PDataManager(IComponent* component)
     : ProxyComponent(component), m_pComp(dynamic_cast<CDataManager*>(component))
 {
@@ -63,4 +65,10 @@ int PDataManager::createData(const ID& uri, const BData& value)
 {
     CDataManager* component = m_pComp.load();
     return component != nullptr ? component->createData(uri, value) : CDataManager::eNO_SUCH_DATA;
+}
+
+int PDataManager::createData(const ID& uri, BSet&& value)
+{
+    CDataManager* component = m_pComp.load();
+    return component != nullptr ? component->createData(uri, std::move(value)) : CDataManager::eNO_SUCH_DATA;
 }

@@ -167,6 +167,15 @@ StringSet BSet::getAllKeys() const
     return keys;
 }
 
+void BSet::drain(const std::function<void(const ACE_WString& key, std::unique_ptr<BData> value)>& take)
+{
+    std::vector<Entry> entries;
+    entries.swap(m_entries);
+    m_index.clear();
+    for (Entry& entry : entries)
+        take(entry.key, std::move(entry.value));
+}
+
 void BSet::clear()
 {
     m_entries.clear();

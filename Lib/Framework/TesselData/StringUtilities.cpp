@@ -405,6 +405,21 @@ ACE_WString StringUtilities::narrowVsprintf(const char* format, va_list args)
     return WideString::fromStd(formatWith(format, args));
 }
 
+ACE_WString StringUtilities::withNumber(const wchar_t* prefix, unsigned int number)
+{
+    wchar_t digits[16];
+    const size_t end = sizeof(digits) / sizeof(digits[0]);
+    size_t start = end;
+    do
+    {
+        digits[--start] = static_cast<wchar_t>(L'0' + number % 10);
+        number /= 10;
+    } while (number != 0);
+    ACE_WString text(prefix);
+    text += ACE_WString(digits + start, end - start);
+    return text;
+}
+
 int StringUtilities::toInt(const wchar_t* text)
 {
     if (text == nullptr)

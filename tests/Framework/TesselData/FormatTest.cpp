@@ -53,6 +53,8 @@ TEST(Format, TranslatesEachConversion)
     for (const auto& [actual, expected] : cases)
         EXPECT_EQ(actual, expected);
     EXPECT_EQ(utf8(StringUtilities::wideSprintf(L"%s=%d", L"n", 3)) + utf8(StringUtilities::wideSprintf(nullptr)), "n=3");
+    for (unsigned int number : {0u, 7u, 10u, 19u, 4294967295u})
+        EXPECT_EQ(StringUtilities::withNumber(L"User#", number), StringUtilities::wideSprintf(L"%s%u", L"User#", number));
 }
 
 TEST(WideString, ConvertsExactlyAndReplacesInvalidBytes)

@@ -149,6 +149,28 @@ TEST_F(DataManagerTest, WritesAndPreloadReplaceAndInnerNodesReadAsTheSetBelowThe
                                                "data:/Config/Paths/Other=2"}));
 }
 
+// A set moved in reads back as the same set published by copy, and is left empty; a refused
+// URI leaves it whole.
+TEST_F(DataManagerTest, ASetMovedInReadsBackAsItsCopy)
+{
+    BSet record;
+    record.setInt(L"state"_w, 3);
+    record.editSet(L"value"_w).setString(L"0001"_w, L"Alpha"_w);
+    record.editSet(L"value"_w).setSet(L"inner"_w, BSet());
+    record.setString(L"selected"_w, L"Alpha"_w);
+    const BSet copy = record;
+    EXPECT_EQ(m_dataManager->createData(ID("tessel:DM?DataManager"), std::move(record)), CDataManager::eNOT_A_DATA_URI);
+    EXPECT_TRUE(record.equals(copy));
+    ASSERT_EQ(m_dataManager->createData(ID("data:/Moved/Combo"), std::move(record)), 0);
+    EXPECT_TRUE(record.isEmpty());
+    publish("data:/Copied/Combo", copy);
+    BSet moved;
+    BSet copied;
+    ASSERT_EQ(m_dataManager->getData(ID("data:/Moved/Combo"), moved), 0);
+    ASSERT_EQ(m_dataManager->getData(ID("data:/Copied/Combo"), copied), 0);
+    EXPECT_TRUE(moved.equals(copy) && copied.equals(copy));
+}
+
 TEST_F(DataManagerTest, ReadersOnOtherThreadsNeverSeeAHalfWrittenRecord)
 {
     std::atomic<bool> done{false};

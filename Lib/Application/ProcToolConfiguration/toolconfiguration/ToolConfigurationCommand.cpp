@@ -29,6 +29,7 @@
 #include <numeric>
 #include <string>
 #include <string_view>
+#include <utility>
 #include <vector>
 
 namespace
@@ -42,7 +43,7 @@ const long kStateEditable = 3;
 const long kStateFixed = 2;
 const long kStateDisplayOnly = 19;
 
-const wchar_t* const kControlUriFormat = L"data:/Auto/SystemMenu/%s";
+const wchar_t* const kControlUriPrefix = L"data:/Auto/SystemMenu/";
 const wchar_t* const kActivePreparateur = L"ActivePreparateur";
 const wchar_t* const kDistributionFolder = L"DistributionFolderPath";
 const wchar_t* const kModeLocal = L"LOCAL";
@@ -82,7 +83,15 @@ void warning(const wchar_t* message)
 
 ID controlUri(const ACE_WString& name)
 {
-    return ID(StringUtilities::wideSprintf(kControlUriFormat, name.c_str()));
+    ACE_WString uri(kControlUriPrefix);
+    uri += name.c_str();
+    return ID(uri);
+}
+
+// "User#<index>" for an index from 0.
+ACE_WString userKey(int index)
+{
+    return StringUtilities::withNumber(L"User#", static_cast<unsigned int>(index));
 }
 
 ACE_WString toWide(const QString& text)
@@ -636,7 +645,7 @@ void ToolConfigurationCommand::createDataForCombo(const ACE_WString& name)
         selected = firstLabel;
     record.set(L"selected", BString(selected));
     m_pWorkshopInfoUpdater->setDefaultBrand(selected);
-    m_dataManager->createData(controlUri(name), record);
+    m_dataManager->createData(controlUri(name), std::move(record));
 }
 
 void ToolConfigurationCommand::createDataForUpdateRadioButtons()
@@ -970,14 +979,18 @@ void ToolConfigurationCommand::saveUsersAndApp2App()
     m_pUsersUpdater->removeAllUsers();
     for (int i = 0; i < userSet.size(); ++i)
     {
-        BSet user(10);
-        userSet.getSet(StringUtilities::wideSprintf(L"User#%d", i), user);
+        // Read in place; a missing entry or one of another kind gives an empty user.
         ACE_WString name;
         ACE_WString address;
         ACE_WString phone;
-        user.getString(L"name", name);
-        user.getString(L"address", address);
-        user.getString(L"phone", phone);
+        const BData* found = userSet.find(userKey(i));
+        if (found != nullptr && found->type() == BData::eSET)
+        {
+            const BSet& user = static_cast<const BSet&>(*found);
+            user.getString(L"name", name);
+            user.getString(L"address", address);
+            user.getString(L"phone", phone);
+        }
         m_pUsersUpdater->addUser(name, address, phone);
     }
 

@@ -17,6 +17,7 @@
 
 #include <memory>
 #include <string>
+#include <utility>
 
 namespace
 {
@@ -33,7 +34,7 @@ const wchar_t* const kUsersFileUri = L"data:/Configuration/DoC/FicheDiagnostic/F
 const wchar_t* const kUsersFileDefault = L"../../Data/User/FicheDiagParams.xml";
 const wchar_t* const kWorkshopPhoneUri = L"data:/Auto/SystemMenu/PhoneNumberEdit";
 
-const wchar_t* const kUserKeyFormat = L"User#%d";
+const wchar_t* const kUserKeyPrefix = L"User#";
 const size_t kUserKeyPrefixLength = 5;
 const int kMaxUsers = 20;
 
@@ -76,9 +77,10 @@ QString toQString(const ACE_WString& text)
     return QString::fromWCharArray(text.c_str(), static_cast<qsizetype>(text.length()));
 }
 
+// "User#<index>" for an index from 0.
 ACE_WString userKey(int index)
 {
-    return StringUtilities::wideSprintf(kUserKeyFormat, index);
+    return StringUtilities::withNumber(kUserKeyPrefix, static_cast<unsigned int>(index));
 }
 
 QString translated(PBText& text, int number, const wchar_t* defaultText)
@@ -142,7 +144,7 @@ void UsersCommand::createDMUsersData()
             users.put(userKey(published++), std::move(entry));
         }
     }
-    m_dataManager->createData(ID(kUserSetUri), users);
+    m_dataManager->createData(ID(kUserSetUri), std::move(users));
 }
 
 void UsersCommand::populateForbiddenList(const BSet& users, QStringList& names)
