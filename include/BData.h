@@ -5,6 +5,7 @@
 #include <ace/SString.h>
 
 #include <memory>
+#include <string>
 
 // Base of the typed values of the data library.
 class TESSEL_EXPORT BData
@@ -33,6 +34,8 @@ public:
     // Writes this value as XML to `path`, atomically: temporary file, flush, rename.
     // `flag` is kept for callers; it changes nothing. False leaves any old file untouched.
     bool save(const ACE_WString& path, bool flag) const;
+    // The same, handing back in `written` the bytes the file now holds (empty on failure).
+    bool save(const ACE_WString& path, bool flag, std::string& written) const;
 
 protected:
     BData() = default;

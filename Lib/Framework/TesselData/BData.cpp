@@ -50,8 +50,15 @@ bool BData::load(const ACE_WString& path)
     return true;
 }
 
-bool BData::save(const ACE_WString& path, bool /*flag*/) const
+bool BData::save(const ACE_WString& path, bool flag) const
 {
+    std::string written;
+    return save(path, flag, written);
+}
+
+bool BData::save(const ACE_WString& path, bool /*flag*/, std::string& written) const
+{
+    written.clear();
     const std::string file = SettingsFile::nativePath(WideString::toUtf8(path));
     if (type() != eSET)
     {
@@ -72,5 +79,6 @@ bool BData::save(const ACE_WString& path, bool /*flag*/) const
         warn("save", file, error);
         return false;
     }
+    written = std::move(bytes);
     return true;
 }

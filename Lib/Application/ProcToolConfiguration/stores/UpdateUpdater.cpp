@@ -117,9 +117,16 @@ void UpdateUpdater::setInitialValues()
 
 bool UpdateUpdater::save(ACE_WString path)
 {
+    std::string written;
+    return save(path, written);
+}
+
+bool UpdateUpdater::save(const ACE_WString& path, std::string& written)
+{
+    written.clear();
     if (!enter(m_loaded, L"[bool UpdateUpdater::save()]"))
         return false;
-    return m_settings.save(path, false);
+    return m_settings.save(path, false, written);
 }
 
 bool UpdateUpdater::getCheckInternet()

@@ -5,6 +5,8 @@
 
 #include <ace/SString.h>
 
+#include <string>
+
 // The online-update settings file: one flat set, loaded once and saved to any path.
 class TESSEL_EXPORT UpdateUpdater
 {
@@ -18,6 +20,8 @@ public:
     bool load();
     void setInitialValues();
     bool save(ACE_WString path);
+    // The same, handing back the bytes written (empty on failure).
+    bool save(const ACE_WString& path, std::string& written);
 
     bool getCheckInternet();
     bool setCheckInternet(bool value);

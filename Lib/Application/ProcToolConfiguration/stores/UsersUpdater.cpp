@@ -201,9 +201,16 @@ bool UsersUpdater::reload()
 
 bool UsersUpdater::save()
 {
+    std::string written;
+    return save(written);
+}
+
+bool UsersUpdater::save(std::string& written)
+{
+    written.clear();
     if (!enter(m_loaded, L"[bool UsersUpdater::save()]"))
         return false;
-    return m_content.save(m_path, false);
+    return m_content.save(m_path, false, written);
 }
 
 unsigned int UsersUpdater::getMaxUserCount()

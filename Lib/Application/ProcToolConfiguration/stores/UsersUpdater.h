@@ -5,6 +5,8 @@
 
 #include <ace/SString.h>
 
+#include <string>
+
 // The diagnostic-sheet parameters file: activation flag, up to 20 users in numbered slots and
 // the App2App connection parameters.
 class TESSEL_EXPORT UsersUpdater
@@ -19,6 +21,8 @@ public:
     bool load();
     bool reload();
     bool save();
+    // The same, handing back the bytes written (empty on failure).
+    bool save(std::string& written);
     unsigned int getMaxUserCount();
 
     unsigned int getUserCount();

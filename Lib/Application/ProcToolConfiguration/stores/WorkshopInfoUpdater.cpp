@@ -141,6 +141,13 @@ bool WorkshopInfoUpdater::load()
 
 bool WorkshopInfoUpdater::save()
 {
+    std::string written;
+    return save(written);
+}
+
+bool WorkshopInfoUpdater::save(std::string& written)
+{
+    written.clear();
     if (!m_loaded)
     {
         logNotLoaded(L"save");
@@ -152,7 +159,7 @@ bool WorkshopInfoUpdater::save()
             L"WorkshopInfoUpdater::save: could not create parent folder for file '%s'", m_path.c_str()));
         return false;
     }
-    return m_content.save(m_path, false);
+    return m_content.save(m_path, false, written);
 }
 
 const ACE_WString WorkshopInfoUpdater::readText(const wchar_t* key, const wchar_t* operation)

@@ -5,6 +5,8 @@
 
 #include <ace/SString.h>
 
+#include <string>
+
 // The workshop information file: the workshop's identity, its default brand and the
 // identity-provider information. A missing file gives an empty store that saving creates.
 class TESSEL_EXPORT WorkshopInfoUpdater
@@ -18,6 +20,8 @@ public:
     bool isLoaded();
     bool load();
     bool save();
+    // The same, handing back the bytes written (empty on failure).
+    bool save(std::string& written);
 
     const ACE_WString getBusinessNumber();
     bool setBusinessNumber(const ACE_WString& value);

@@ -9,6 +9,11 @@ void OwnSaves::remember(const std::string& path)
     m_saved[path] = fingerprintOf(path);
 }
 
+void OwnSaves::remember(const std::string& path, const std::string& written)
+{
+    m_saved[path] = fingerprintOfBytes(written);
+}
+
 bool OwnSaves::isOwnSave(const std::string& path)
 {
     const auto it = m_saved.find(path);
@@ -27,7 +32,15 @@ OwnSaves::Fingerprint OwnSaves::fingerprintOf(const std::string& path)
     if (!in)
         return fingerprint;
     const std::string content((std::istreambuf_iterator<char>(in)), std::istreambuf_iterator<char>());
+    fingerprint = fingerprintOfBytes(content);
     fingerprint.exists = !in.bad();
+    return fingerprint;
+}
+
+OwnSaves::Fingerprint OwnSaves::fingerprintOfBytes(const std::string& content)
+{
+    Fingerprint fingerprint;
+    fingerprint.exists = true;
     fingerprint.size = content.size();
     fingerprint.hash = std::hash<std::string>()(content);
     return fingerprint;

@@ -11,6 +11,8 @@ class OwnSaves
 public:
     // Remembers what `path` holds now, right after a save.
     void remember(const std::string& path);
+    // Remembers that `path` holds `written`, the bytes a save just wrote to it.
+    void remember(const std::string& path, const std::string& written);
     // True when `path` still holds what was remembered for it. A file found different is
     // forgotten, so coming back to the saved content later is a change again.
     bool isOwnSave(const std::string& path);
@@ -27,6 +29,7 @@ private:
         }
     };
     static Fingerprint fingerprintOf(const std::string& path);
+    static Fingerprint fingerprintOfBytes(const std::string& content);
 
     std::map<std::string, Fingerprint> m_saved;
 };

@@ -832,21 +832,35 @@ void ToolConfigurationCommand::onOKButtonClicked()
         m_dataManager->getBool(controlUri(L"ASRMChk"), m_bRecordingMode);
     TesselLog_Static::setLevel_static(m_bRecordingMode ? 10 : 0);
 
-    if (m_pWorkshopInfoUpdater != nullptr && !m_pWorkshopInfoUpdater->save())
+    // A saved file is never empty (it holds at least its root element), so empty means not saved.
+    std::string workshopWritten;
+    if (m_pWorkshopInfoUpdater != nullptr && !m_pWorkshopInfoUpdater->save(workshopWritten))
         warning(L"[ToolConfigurationCommand::onOKButtonClicked] : Cannot save workshop data!");
 
+    std::string usersWritten;
     if (m_dataManager.isAvailable())
-        saveUsersAndApp2App();
+        saveUsersAndApp2App(usersWritten);
 
+    std::string updateWritten;
     if (m_pUpdateUpdater != nullptr)
-        saveOnlineUpdateAndTask();
+        saveOnlineUpdateAndTask(updateWritten);
 
     ACE_WString updatePath = readPath(kUpdateFileDefault, kUpdateFileUri);
     if (updatePath.is_empty())
         updatePath = kUpdateFileDefault;
-    for (const ACE_WString& path : {readPath(kWorkshopFileDefault, kWorkshopFileUri),
-                                    readPath(kUsersFileDefault, kUsersFileUri), updatePath})
-        m_ownSaves.remember(WideString::toUtf8(path));
+    const std::pair<ACE_WString, const std::string*> saves[] = {
+        {readPath(kWorkshopFileDefault, kWorkshopFileUri), &workshopWritten},
+        {readPath(kUsersFileDefault, kUsersFileUri), &usersWritten},
+        {updatePath, &updateWritten}};
+    for (const auto& save : saves)
+    {
+        // The fingerprint comes from the bytes just written; a file not saved is read as it is.
+        const std::string path = WideString::toUtf8(save.first);
+        if (save.second->empty())
+            m_ownSaves.remember(path);
+        else
+            m_ownSaves.remember(path, *save.second);
+    }
 
     SmartProxy<PMediator> mediator;
     if (mediator.acquire(ID(kMediatorID)))
@@ -967,8 +981,9 @@ void ToolConfigurationCommand::onConfigurationTestButtonClicked()
 // ---------------------------------------------------------------------------------------------
 // OK helpers
 
-void ToolConfigurationCommand::saveUsersAndApp2App()
+void ToolConfigurationCommand::saveUsersAndApp2App(std::string& written)
 {
+    written.clear();
     ACE_Guard<ACE_Thread_Mutex> guard(m_storesMutex);
 
     BSet userSet(10);
@@ -1009,12 +1024,13 @@ void ToolConfigurationCommand::saveUsersAndApp2App()
     }
 
     m_pUsersUpdater->setApp2AppParams(port, ip, dealerId);
-    if (!m_pUsersUpdater->save())
+    if (!m_pUsersUpdater->save(written))
         warning(L"[ToolConfigurationCommand::onOKButtonClicked] : Cannot save users data!");
 }
 
-void ToolConfigurationCommand::saveOnlineUpdateAndTask()
+void ToolConfigurationCommand::saveOnlineUpdateAndTask(std::string& written)
 {
+    written.clear();
     std::unique_ptr<OnLineUpdateCommand> onLineUpdate;
     {
         ACE_Guard<ACE_Thread_Mutex> guard(m_storesMutex);
@@ -1024,7 +1040,7 @@ void ToolConfigurationCommand::saveOnlineUpdateAndTask()
             m_dataManager->getString(ID(kUpdateFileUri), path);
         if (path.is_empty())
             path = kUpdateFileDefault;
-        if (!m_pUpdateUpdater->save(path))
+        if (!m_pUpdateUpdater->save(path, written))
             warning(L"[ToolConfigurationCommand::onOKButtonClicked] : Cannot save Preparateur data!");
         else if (m_dataManager.isAvailable())
             // A configuration test left the active path on its temporary copy; the saved file

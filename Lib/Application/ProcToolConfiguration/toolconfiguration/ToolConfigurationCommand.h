@@ -131,8 +131,9 @@ private:
 
     // OK: the users and App2App part of the users file, then the online-update settings and
     // the scheduled task, each under the stores' lock.
-    void saveUsersAndApp2App();
-    void saveOnlineUpdateAndTask();
+    // Each hands back the bytes it wrote, or leaves `written` empty when it did not save.
+    void saveUsersAndApp2App(std::string& written);
+    void saveOnlineUpdateAndTask(std::string& written);
 
     friend class ToolConfigurationCommandTestAccess;
 };
