@@ -23,6 +23,8 @@ public:
     };
     using Listener = std::function<void(const ID& uri)>;
     using ValueVisitor = std::function<void(const ACE_WString& key, const BData& value)>;
+    using NestedValueVisitor =
+        std::function<void(const ACE_WString& setKey, const ACE_WString& key, const BData& value)>;
 
     static const wchar_t* const componentID;
 
@@ -40,6 +42,10 @@ public:
     // Calls `visit` for each value (not nested set) directly in the set at `uri`, in order,
     // without copying them. Runs under the data manager's lock: `visit` must not call it.
     int visitValues(const ID& uri, const ValueVisitor& visit) const;
+    // The same one level down: calls `visit` for each value directly in each set directly in the
+    // set at `uri`, with that set's key, in order. `entries` is the number of entries (values and
+    // sets) directly in the set at `uri`.
+    int visitNestedValues(const ID& uri, int& entries, const NestedValueVisitor& visit) const;
     int setBool(const ID& uri, bool value);
     int getBool(const ID& uri, bool& value) const;
     int setString(const ID& uri, const ACE_WString& value);

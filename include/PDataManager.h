@@ -22,6 +22,9 @@ public:
     int setData(const ID& uri, const BData& value);
     int getData(const ID& uri, BData& value);
     int visitValues(const ID& uri, const std::function<void(const ACE_WString& key, const BData& value)>& visit);
+    int visitNestedValues(
+        const ID& uri, int& entries,
+        const std::function<void(const ACE_WString& setKey, const ACE_WString& key, const BData& value)>& visit);
     int setBool(const ID& uri, bool value);
     int setString(const ID& uri, const ACE_WString& value);
     int getString(const ID& uri, ACE_WString& value);

@@ -335,6 +335,30 @@ int CDataManager::visitValues(const ID& uri, const ValueVisitor& visit) const
     return eOK;
 }
 
+int CDataManager::visitNestedValues(const ID& uri, int& entries, const NestedValueVisitor& visit) const
+{
+    entries = 0;
+    if (!isDataUri(uri))
+    {
+        logNotDataUri("visitNestedValues", uri);
+        return eNOT_A_DATA_URI;
+    }
+    const std::vector<ACE_WString> segments = segmentsOf(uri);
+    std::lock_guard<std::mutex> lock(m_impl->mutex);
+    const Node* node = m_impl->find(segments);
+    if (node == nullptr)
+        return eNO_SUCH_DATA;
+    if (!node->isSet())
+        return eWRONG_TYPE;
+    entries = static_cast<int>(node->children.size());
+    for (const auto& [setKey, set] : node->children)
+        if (set->isSet())
+            for (const auto& [name, child] : set->children)
+                if (!child->isSet())
+                    visit(setKey, name, *child->value);
+    return eOK;
+}
+
 int CDataManager::setBool(const ID& uri, bool value)
 {
     return createData(uri, BBool(value));

@@ -37,6 +37,15 @@ int PDataManager::visitValues(const ID& uri,
     return component != nullptr ? component->visitValues(uri, visit) : CDataManager::eNO_SUCH_DATA;
 }
 
+int PDataManager::visitNestedValues(
+    const ID& uri, int& entries,
+    const std::function<void(const ACE_WString& setKey, const ACE_WString& key, const BData& value)>& visit)
+{
+    entries = 0;
+    CDataManager* component = m_pComp.load();
+    return component != nullptr ? component->visitNestedValues(uri, entries, visit) : CDataManager::eNO_SUCH_DATA;
+}
+
 int PDataManager::setBool(const ID& uri, bool value)
 {
     CDataManager* component = m_pComp.load();

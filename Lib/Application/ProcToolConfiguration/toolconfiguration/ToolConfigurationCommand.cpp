@@ -25,6 +25,7 @@
 #include <QFileDialog>
 
 #include <algorithm>
+#include <deque>
 #include <memory>
 #include <numeric>
 #include <string>
@@ -986,27 +987,49 @@ void ToolConfigurationCommand::saveUsersAndApp2App(std::string& written)
     written.clear();
     ACE_Guard<ACE_Thread_Mutex> guard(m_storesMutex);
 
-    BSet userSet(10);
-    m_dataManager->getData(ID(kUserSetUri), userSet);
+    // The published users' texts, read in place: a set's key and its three strings.
+    struct PublishedUser
+    {
+        ACE_WString key;
+        ACE_WString name;
+        ACE_WString address;
+        ACE_WString phone;
+    };
+    // A deque: growing it copies no strings.
+    std::deque<PublishedUser> published;
+    int entries = 0;
+    m_dataManager->visitNestedValues(
+        ID(kUserSetUri), entries, [&published](const ACE_WString& setKey, const ACE_WString& key, const BData& value) {
+            if (published.empty() || published.back().key != setKey)
+                published.push_back(PublishedUser{setKey, ACE_WString(), ACE_WString(), ACE_WString()});
+            if (value.type() != BData::eSTRING)
+                return;
+            PublishedUser& user = published.back();
+            ACE_WString* field = key == L"name" ? &user.name
+                                 : key == L"address" ? &user.address
+                                 : key == L"phone" ? &user.phone
+                                                   : nullptr;
+            if (field != nullptr)
+                *field = static_cast<const BString&>(value).value();
+        });
     if (m_pUsersUpdater == nullptr)
         return;
 
     m_pUsersUpdater->removeAllUsers();
-    for (int i = 0; i < userSet.size(); ++i)
+    const PublishedUser empty;
+    for (int i = 0; i < entries; ++i)
     {
-        // Read in place; a missing entry or one of another kind gives an empty user.
-        ACE_WString name;
-        ACE_WString address;
-        ACE_WString phone;
-        const BData* found = userSet.find(userKey(i));
-        if (found != nullptr && found->type() == BData::eSET)
-        {
-            const BSet& user = static_cast<const BSet&>(*found);
-            user.getString(L"name", name);
-            user.getString(L"address", address);
-            user.getString(L"phone", phone);
-        }
-        m_pUsersUpdater->addUser(name, address, phone);
+        // A missing entry or one of another kind gives an empty user. Entries are usually in
+        // order, so slot i is tried first.
+        const ACE_WString key = userKey(i);
+        const PublishedUser* user = &empty;
+        if (static_cast<std::size_t>(i) < published.size() && published[i].key == key)
+            user = &published[i];
+        else
+            for (const PublishedUser& candidate : published)
+                if (candidate.key == key)
+                    user = &candidate;
+        m_pUsersUpdater->addUser(user->name, user->address, user->phone);
     }
 
     // A value the dialog never showed keeps what the file holds.
