@@ -58,12 +58,17 @@ TEST_F(DataManagerTest, FailedAccessGivesItsCodeAndLeavesThePresetOutputAlsoThro
     EXPECT_TRUE(text == L"preset"_w && !flag && set.contains(L"preset"_w) && number.value() == 5);
 }
 
-// Visiting reads the values of one set in place, in order; nested sets are not values.
+// Visiting reads the values of one set in place, in order; nested sets are not values. The
+// nested visit reads the values one level down and counts every entry of the set.
 TEST_F(DataManagerTest, VisitingASetSeesItsValuesInOrderAndFailsLikeAReadOtherwise)
 {
+    BSet inner;
+    inner.setString(L"name"_w, L"In"_w);
+    inner.setSet(L"deeper"_w, BSet());
+    inner.setInt(L"n"_w, 2);
     BSet brands;
     brands.setString(L"7"_w, L"Seven"_w);
-    brands.setSet(L"inner"_w, BSet());
+    brands.setSet(L"inner"_w, inner);
     brands.setInt(L"1"_w, 1);
     publish("data:/Brands", brands);
     SmartProxy<PDataManager> dm;
@@ -77,6 +82,17 @@ TEST_F(DataManagerTest, VisitingASetSeesItsValuesInOrderAndFailsLikeAReadOtherwi
     std::string seen;
     EXPECT_EQ(visited("data:/Brands", seen), 0);
     EXPECT_EQ(seen, "7=Seven 1# ");
+    seen.clear();
+    int entries = -1;
+    EXPECT_EQ(dm->visitNestedValues(ID("data:/Brands"), entries,
+                                    [&seen](const ACE_WString& setKey, const ACE_WString& key, const BData& value) {
+                                        seen += utf8(setKey) + "/" + utf8(key) + (value.type() == BData::eSTRING ? "$ " : "# ");
+                                    }),
+              0);
+    EXPECT_EQ(seen, "inner/name$ inner/n# ");
+    EXPECT_EQ(entries, 3);
+    EXPECT_EQ(dm->visitNestedValues(ID("data:/Brands/7"), entries, [](auto&, auto&, auto&) {}), CDataManager::eWRONG_TYPE);
+    EXPECT_EQ(entries, 0);
     seen.clear();
     EXPECT_EQ(visited("data:/Brands/7", seen), CDataManager::eWRONG_TYPE);
     EXPECT_EQ(visited("data:/Nothing", seen), CDataManager::eNO_SUCH_DATA);
