@@ -335,6 +335,28 @@ const ACE_WString WorkshopInfoUpdater::getDefaultBrand()
     return lookup.text(number, ACE_WString());
 }
 
+const ACE_WString WorkshopInfoUpdater::getDefaultBrandKey()
+{
+    if (!m_loaded)
+    {
+        logNotLoaded(L"getDefaultBrand");
+        return ACE_WString();
+    }
+    ACE_WString stored;
+    m_content.getString(kDefaultBrand, stored);
+    return stored;
+}
+
+void WorkshopInfoUpdater::setDefaultBrandKey(const ACE_WString& key)
+{
+    if (!m_loaded)
+    {
+        logNotLoaded(L"setDefaultBrand");
+        return;
+    }
+    m_content.setString(kDefaultBrand, key);
+}
+
 bool WorkshopInfoUpdater::setDefaultBrand(const ACE_WString& brandName)
 {
     if (!m_loaded)

@@ -49,6 +49,10 @@ public:
     const ACE_WString getDefaultBrand();
     // Stores the brand table's key whose displayed name is `brandName`; false when none matches.
     bool setDefaultBrand(const ACE_WString& brandName);
+    // The same without the brand table, for a caller that reads it itself: the stored key as it
+    // is, and storing a key already matched.
+    const ACE_WString getDefaultBrandKey();
+    void setDefaultBrandKey(const ACE_WString& key);
 
 private:
     const ACE_WString readText(const wchar_t* key, const wchar_t* operation);

@@ -584,24 +584,42 @@ void ToolConfigurationCommand::createDataForCombo(const ACE_WString& name)
     if (!m_dataManager.isAvailable() || m_pWorkshopInfoUpdater == nullptr)
         return;
 
-    // The brand table read in place. A key of the full width is its own padded key, and only
-    // its value can be a default label: the one of the item with that padded key.
+    // The brand table read in place, once. A key of the full width is its own padded key, and
+    // only its value can be a default label: the one of the item with that padded key. A shorter
+    // key keeps its own key and value for the default brand's match.
     struct Brand
     {
         ACE_WString padded;
         bool ownPadded;
-        ACE_WString value;
+        // The key is the last keyLength characters of `padded`.
+        size_t keyLength;
+        // The string value, in `values`.
+        size_t valueOffset;
+        size_t valueLength;
+        // The item's label when it is also this brand's text, else null.
+        const ACE_WString* label;
     };
-    int count = 0;
-    m_dataManager->visitValues(ID(kBrandsUri), [&count](const ACE_WString&, const BData&) { ++count; });
-    std::vector<Brand> brands;
-    brands.reserve(static_cast<size_t>(count));
-    m_dataManager->visitValues(ID(kBrandsUri), [&brands](const ACE_WString& key, const BData& value) {
+    const ACE_WString storedKey = m_pWorkshopInfoUpdater->getDefaultBrandKey();
+    bool storedFound = false;
+    // A deque: growing it copies no strings. The values share one buffer.
+    std::deque<Brand> brands;
+    std::wstring values;
+    m_dataManager->visitValues(ID(kBrandsUri), [&](const ACE_WString& key, const BData& value) {
         const bool ownPadded = key.length() >= kBrandKeyWidth;
-        brands.push_back({ownPadded ? key : padBrandKey(key), ownPadded,
-                          ownPadded && value.type() == BData::eSTRING ? static_cast<const BString&>(value).value()
-                                                                      : ACE_WString()});
+        const size_t valueOffset = values.size();
+        if (value.type() == BData::eSTRING)
+        {
+            const ACE_WString& text = static_cast<const BString&>(value).value();
+            values.append(text.c_str(), text.length());
+        }
+        brands.push_back(
+            {ownPadded ? key : padBrandKey(key), ownPadded, key.length(), valueOffset, values.size() - valueOffset, nullptr});
+        storedFound = storedFound || (storedKey.length() != 0 && key == storedKey);
     });
+    const auto valueOf = [&values](const Brand& brand) {
+        return std::wstring_view(values.data() + brand.valueOffset, brand.valueLength);
+    };
+    const auto keyOf = [](const Brand& brand) { return brand.padded.c_str() + (brand.padded.length() - brand.keyLength); };
 
     SmartProxy<PBText> bText;
     if (!bText.acquire(ID(kBTextID)))
@@ -628,11 +646,26 @@ void ToolConfigurationCommand::createDataForCombo(const ACE_WString& name)
         ACE_WString defaultLabel;
         for (size_t i = first; i < end; ++i)
             if (brands[order[i]].ownPadded)
-                defaultLabel = brands[order[i]].value;
+            {
+                const std::wstring_view value = valueOf(brands[order[i]]);
+                defaultLabel = ACE_WString(value.data(), value.size());
+            }
         const ACE_WString& paddedKey = brands[order[first]].padded;
-        auto label = std::make_unique<BString>(bText->getText(StringUtilities::toInt(paddedKey.c_str()), defaultLabel));
+        const int number = StringUtilities::toInt(paddedKey.c_str());
+        auto label = std::make_unique<BString>(bText->getText(number, defaultLabel));
         if (first == 0)
             firstLabel = label->value();
+        // A brand's text is the label when it asks for the same number and either the number has
+        // a text (the label is not the default) or its default is the same.
+        const bool hasText = label->value() != defaultLabel;
+        const std::wstring_view defaultView(defaultLabel.c_str(), defaultLabel.length());
+        for (size_t i = first; i < end; ++i)
+        {
+            Brand& brand = brands[order[i]];
+            if (brand.ownPadded ||
+                ((hasText || valueOf(brand) == defaultView) && StringUtilities::toInt(keyOf(brand)) == number))
+                brand.label = &label->value();
+        }
         items->put(paddedKey, std::move(label));
         first = end;
     }
@@ -641,11 +674,36 @@ void ToolConfigurationCommand::createDataForCombo(const ACE_WString& name)
     record.put(L"state", std::make_unique<BInt>(kStateEditable));
     record.put(L"value", std::move(items));
 
-    ACE_WString selected = m_pWorkshopInfoUpdater->getDefaultBrand();
+    // The default brand's text, as WorkshopInfoUpdater::getDefaultBrand gives it.
+    ACE_WString selected;
+    const int storedNumber = storedFound ? StringUtilities::toInt(storedKey.c_str()) : 0;
+    if (storedNumber != 0)
+        selected = bText->getText(storedNumber, ACE_WString());
     if (selected.is_empty() && !brands.empty())
         selected = firstLabel;
     record.set(L"selected", BString(selected));
-    m_pWorkshopInfoUpdater->setDefaultBrand(selected);
+
+    // The first brand in table order whose text is the selected label, else the first brand, as
+    // WorkshopInfoUpdater::setDefaultBrand matches it.
+    ACE_WString selectedKey;
+    for (size_t i = 0; i < brands.size(); ++i)
+    {
+        const Brand& brand = brands[i];
+        bool matches = false;
+        if (brand.label != nullptr)
+            matches = *brand.label == selected;
+        else
+        {
+            const std::wstring_view value = valueOf(brand);
+            matches = bText->getText(StringUtilities::toInt(keyOf(brand)), ACE_WString(value.data(), value.size())) ==
+                      selected;
+        }
+        if (i == 0 || matches)
+            selectedKey = keyOf(brand);
+        if (matches)
+            break;
+    }
+    m_pWorkshopInfoUpdater->setDefaultBrandKey(selectedKey);
     m_dataManager->createData(controlUri(name), std::move(record));
 }
 
