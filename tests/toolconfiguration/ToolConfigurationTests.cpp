@@ -614,7 +614,7 @@ TEST_F(Publication, BrandItemsArePaddedSortedAndMergedWithTheirDefaultLabels)
     brands.setString(L"0007"_w, L"Zero seven"_w);
     brands.setString(L"2"_w, L"Two"_w);
     ASSERT_EQ(m_dataManager->createData(ID(Uri::kBrands), brands), 0);
-    makeCommand();
+    ToolConfigurationCommand& command = makeCommand();
     const BSet combo = record("BrandCombo");
     BSet items;
     ASSERT_EQ(combo.getSet(L"value"_w, items), 0);
@@ -629,5 +629,15 @@ TEST_F(Publication, BrandItemsArePaddedSortedAndMergedWithTheirDefaultLabels)
     ACE_WString selected;
     combo.getString(L"selected"_w, selected);
     EXPECT_EQ(utf8(selected), "Marque B");
+    EXPECT_EQ(utf8(Access::workshop(command)->getDefaultBrandKey()), "2");
+
+    // Without a text, a short key's own value is its text: "12" shows "Douze", not the item's label.
+    BSet untexted(10);
+    untexted.setString(L"12"_w, L"Douze"_w);
+    untexted.setString(L"0012"_w, L"Twelve"_w);
+    ASSERT_EQ(m_dataManager->createData(ID(Uri::kBrands), untexted), 0);
+    Access::createDMData(command, true);
+    EXPECT_EQ(shown("BrandCombo"), "3|Twelve");
+    EXPECT_EQ(utf8(Access::workshop(command)->getDefaultBrandKey()), "0012");
 }
 }
