@@ -128,7 +128,8 @@ BenchSetup::BenchSetup(int brands) : m_typed(10)
     dataManager->createData(ID(kWorkshopFileUri), BString(w(path(File::Workshop))));
     dataManager->createData(ID(kUsersFileUri), BString(w(path(File::Users))));
     dataManager->createData(ID(kUpdateFileUri), BString(w(path(File::Update))));
-    dataManager->createData(ID(kUpdateTmpFileUri), BString(w((m_dir / "Data/User/OnLineUpdate/PreparateurTmp.xml").string())));
+    dataManager->createData(ID(kUpdateTmpFileUri),
+                            BString(w((m_dir / "Data/User/OnLineUpdate/PreparateurTmp.xml").string())));
     BSet brandSet(10);
     for (int n = 1; n <= brands; ++n)
     {
@@ -142,8 +143,8 @@ BenchSetup::BenchSetup(int brands) : m_typed(10)
     TesselLog_Static::setLogFile(w((m_dir / "bench.log").string()));
     TesselLog_Static::setLevel_static(0);
 
-    m_factory = std::make_unique<CToolConfigControllersFactory>(
-        ID(L"proc:ProcToolConfiguration?ToolConfigControllersFactory"));
+    m_factory =
+        std::make_unique<CToolConfigControllersFactory>(ID(L"proc:ProcToolConfiguration?ToolConfigControllersFactory"));
     collectPublishedRecords();
 }
 

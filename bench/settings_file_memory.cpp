@@ -117,8 +117,8 @@ int main(int argc, char** argv)
             status = 1;
             continue;
         }
-        std::printf("%-15s %8zu %8d %9ld KiB %9ld KiB %9ld KiB = %.1f MiB\n", c.name, document.size(), values,
-                    before, after, after - before, (after - before) / 1024.0);
+        std::printf("%-15s %8zu %8d %9ld KiB %9ld KiB %9ld KiB = %.1f MiB\n", c.name, document.size(), values, before,
+                    after, after - before, (after - before) / 1024.0);
     }
     std::filesystem::remove_all(folder);
     return status;

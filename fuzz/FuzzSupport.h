@@ -11,14 +11,14 @@
 #include <string>
 
 // Stops the run (a finding for libFuzzer) when a property of the code under test does not hold.
-#define FUZZ_CHECK(condition)                                                                      \
-    do                                                                                             \
-    {                                                                                              \
-        if (!(condition))                                                                          \
-        {                                                                                          \
-            std::fprintf(stderr, "%s:%d: check failed: %s\n", __FILE__, __LINE__, #condition);     \
-            __builtin_trap();                                                                      \
-        }                                                                                          \
+#define FUZZ_CHECK(condition)                                                                                          \
+    do                                                                                                                 \
+    {                                                                                                                  \
+        if (!(condition))                                                                                              \
+        {                                                                                                              \
+            std::fprintf(stderr, "%s:%d: check failed: %s\n", __FILE__, __LINE__, #condition);                         \
+            __builtin_trap();                                                                                          \
+        }                                                                                                              \
     } while (0)
 
 // A folder of the run's own under $TMPDIR, removed at exit.

@@ -18,7 +18,8 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
     normaliseDottedAddress(address);
     const std::wstring after = WideString::toStd(address);
     if (std::count(after.begin(), after.end(), L'.') != std::count(before.begin(), before.end(), L'.') ||
-        !std::all_of(after.begin(), after.end(), [](wchar_t c) { return c == L'.' || c == L'-' || (c >= L'0' && c <= L'9'); }))
+        !std::all_of(after.begin(), after.end(),
+                     [](wchar_t c) { return c == L'.' || c == L'-' || (c >= L'0' && c <= L'9'); }))
     {
         std::fprintf(stderr, "'%s' gave '%s'\n", WideString::toUtf8(before.c_str()).c_str(),
                      WideString::toUtf8(after.c_str()).c_str());

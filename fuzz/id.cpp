@@ -2,8 +2,8 @@
 // and through a wide string holding the whole input. The accessors must give back parts that
 // put the text together again.
 
-#include "FuzzSupport.h"
 #include "ID.h"
+#include "FuzzSupport.h"
 #include "WideString.h"
 
 #include <cstddef>

@@ -32,10 +32,7 @@ public:
         return EventRegistry::instance().deliver(typeName(), &target, &event);
     }
 
-    static int broadcast(const TEvent& event)
-    {
-        return EventRegistry::instance().deliver(typeName(), nullptr, &event);
-    }
+    static int broadcast(const TEvent& event) { return EventRegistry::instance().deliver(typeName(), nullptr, &event); }
 
 private:
     static std::string typeName() { return typeid(TEvent).name(); }

@@ -35,8 +35,7 @@ public:
     };
     using Sink = std::function<void(const Record&)>;
 
-    static void logTrace_static(const char* component, const char* file, const char* className,
-                                const wchar_t* message);
+    static void logTrace_static(const char* component, const char* file, const char* className, const wchar_t* message);
     static void logInformation_static(const char* component, const char* file, const char* className,
                                       const wchar_t* message);
     static void logWarning_static(const char* component, const char* file, const char* className,
@@ -46,8 +45,8 @@ public:
     static void logError_static(const char* component, const char* file, const char* className, int code,
                                 const wchar_t* format, ...);
     // Generic entry point: `level` is one of Level (16 failures, 1 tolerated conditions).
-    static void log_static(int level, int code, const char* component, const char* file,
-                           const char* className, const wchar_t* format, ...);
+    static void log_static(int level, int code, const char* component, const char* file, const char* className,
+                           const wchar_t* format, ...);
 
     // Verbosity of the log file: 10 writes every line (recording mode), 0 only warnings and
     // errors. Sinks receive the lines of their own levels.
@@ -68,5 +67,5 @@ public:
 };
 
 // Signature of TesselLog_Static::log_static, for modules that log through a pointer.
-using TesselLogFunction = void (*)(int level, int code, const char* component, const char* file,
-                                   const char* className, const wchar_t* format, ...);
+using TesselLogFunction = void (*)(int level, int code, const char* component, const char* file, const char* className,
+                                   const wchar_t* format, ...);

@@ -12,7 +12,9 @@ namespace
 const wchar_t* const kHandlerID = L"host:ToolConfigurationHost?Problems";
 }
 
-HostProblems::HostProblems() : m_serial(0), m_clearedAt(0), m_sink(0) {}
+HostProblems::HostProblems() : m_serial(0), m_clearedAt(0), m_sink(0)
+{
+}
 
 HostProblems::~HostProblems()
 {
@@ -30,12 +32,13 @@ bool HostProblems::start()
             serial = ++m_serial;
         }
         const bool error = record.level >= TesselLog_Static::eERROR;
-        const QString text = QString::fromWCharArray(record.message.c_str(), static_cast<qsizetype>(record.message.length()));
+        const QString text =
+            QString::fromWCharArray(record.message.c_str(), static_cast<qsizetype>(record.message.length()));
         if (QThread::currentThread() == thread())
             this->take(serial, error, text);
         else
-            QMetaObject::invokeMethod(this, [this, serial, error, text]() { this->take(serial, error, text); },
-                                      Qt::QueuedConnection);
+            QMetaObject::invokeMethod(
+                this, [this, serial, error, text]() { this->take(serial, error, text); }, Qt::QueuedConnection);
     };
     m_sink = TesselLog_Static::addSink(take, TesselLog_Static::eWARNING);
     if (m_sink == 0)
@@ -119,5 +122,6 @@ void HostProblems::handleEvent(const CustomEvent& event)
     if (QThread::currentThread() == thread())
         beginAction();
     else
-        QMetaObject::invokeMethod(this, [this]() { beginAction(); }, Qt::QueuedConnection);
+        QMetaObject::invokeMethod(
+            this, [this]() { beginAction(); }, Qt::QueuedConnection);
 }

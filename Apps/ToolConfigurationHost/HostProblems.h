@@ -57,8 +57,8 @@ private:
     void take(std::uint64_t serial, bool error, const QString& text);
 
     std::mutex m_mutex;
-    std::uint64_t m_serial;  // under m_mutex: lines seen so far
-    std::uint64_t m_clearedAt;  // GUI thread: lines up to this serial are forgotten
+    std::uint64_t m_serial;    // under m_mutex: lines seen so far
+    std::uint64_t m_clearedAt; // GUI thread: lines up to this serial are forgotten
     std::vector<Problem> m_problems;
     int m_sink;
 };

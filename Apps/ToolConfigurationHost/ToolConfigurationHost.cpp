@@ -92,8 +92,9 @@ bool ToolConfigurationHost::start(const QString& dataFolder, const QString& conf
     if (!folder.isDir())
         return fail(QStringLiteral("data folder '%1' does not exist").arg(dataFolder));
     m_workingFolder = folder.absoluteFilePath();
-    const QString config = configFile.isEmpty() ? QDir(m_workingFolder).absoluteFilePath(QLatin1String(kDefaultConfigFile))
-                                                : QFileInfo(configFile).absoluteFilePath();
+    const QString config = configFile.isEmpty()
+                               ? QDir(m_workingFolder).absoluteFilePath(QLatin1String(kDefaultConfigFile))
+                               : QFileInfo(configFile).absoluteFilePath();
     m_previousFolder = QDir::currentPath();
     if (!QDir::setCurrent(m_workingFolder))
         return fail(QStringLiteral("cannot change to the data folder '%1'").arg(m_workingFolder));
@@ -117,8 +118,8 @@ bool ToolConfigurationHost::start(const QString& dataFolder, const QString& conf
         return fail(QStringLiteral("cannot read the host configuration '%1'").arg(config));
 
     const QString catalogueUri = QStringLiteral("data:/Configuration/Host/TextCatalogues/") + language;
-    const QString catalogue = configuredPath(toWide(catalogueUri).c_str(),
-                                             QStringLiteral("Texts/BText_%1.xml").arg(language));
+    const QString catalogue =
+        configuredPath(toWide(catalogueUri).c_str(), QStringLiteral("Texts/BText_%1.xml").arg(language));
     if (!m_text->loadCatalogue(toWide(catalogue)))
         return fail(QStringLiteral("no text catalogue for the language '%1' (%2)").arg(language, catalogue));
 
@@ -132,9 +133,9 @@ bool ToolConfigurationHost::start(const QString& dataFolder, const QString& conf
     m_previousTasksFolder = TaskSchedulerSettings::tasksFolder();
     TaskSchedulerSettings::setTasksFolder(tasksFolder.toStdString());
     TesselLog_Static::logInformation_static(kComponent, kFile, kClass,
-                                           TaskSchedulerSettings::backend() == TaskSchedulerSettings::eCron
-                                               ? L"task scheduler: cron (the tasks' lines in the crontab)"
-                                               : L"task scheduler: files (the tasks are not run)");
+                                            TaskSchedulerSettings::backend() == TaskSchedulerSettings::eCron
+                                                ? L"task scheduler: cron (the tasks' lines in the crontab)"
+                                                : L"task scheduler: files (the tasks are not run)");
 
     // Before the controllers: a changed file clears the list before they read it again.
     if (!m_problems->start())

@@ -71,22 +71,25 @@ int main(int argc, char** argv)
     QApplication::setApplicationName(QStringLiteral("ToolConfigurationHost"));
 
     QCommandLineParser parser;
-    const QCommandLineOption helpOption({QStringLiteral("h"), QStringLiteral("help")}, QStringLiteral("Print the help."));
+    const QCommandLineOption helpOption({QStringLiteral("h"), QStringLiteral("help")},
+                                        QStringLiteral("Print the help."));
     const QCommandLineOption listControlsOption(QStringLiteral("list-controls"),
                                                 QStringLiteral("Print the controls --set takes."));
-    const QCommandLineOption dataOption(QStringLiteral("data"), QStringLiteral("Working folder with the settings (default: the current folder)."),
-                                        QStringLiteral("DIR"), QDir::currentPath());
-    const QCommandLineOption configOption(QStringLiteral("config"),
-                                          QStringLiteral("Host configuration (default: DIR/ToolConfigurationHost.xml)."),
-                                          QStringLiteral("FILE"));
-    const QCommandLineOption languageOption(QStringLiteral("language"), QStringLiteral("Language of the texts: en or fr."),
-                                            QStringLiteral("LANG"), QStringLiteral("en"));
+    const QCommandLineOption dataOption(
+        QStringLiteral("data"), QStringLiteral("Working folder with the settings (default: the current folder)."),
+        QStringLiteral("DIR"), QDir::currentPath());
+    const QCommandLineOption configOption(
+        QStringLiteral("config"), QStringLiteral("Host configuration (default: DIR/ToolConfigurationHost.xml)."),
+        QStringLiteral("FILE"));
+    const QCommandLineOption languageOption(QStringLiteral("language"),
+                                            QStringLiteral("Language of the texts: en or fr."), QStringLiteral("LANG"),
+                                            QStringLiteral("en"));
     const QCommandLineOption screenshotOption(QStringLiteral("screenshot"),
                                               QStringLiteral("Write a PNG picture of the window to FILE."),
                                               QStringLiteral("FILE"));
-    const QCommandLineOption setOption(QStringLiteral("set"),
-                                       QStringLiteral("Change a field through its widget, e.g. NameEdit=Smith (repeatable)."),
-                                       QStringLiteral("Control=Value"));
+    const QCommandLineOption setOption(
+        QStringLiteral("set"), QStringLiteral("Change a field through its widget, e.g. NameEdit=Smith (repeatable)."),
+        QStringLiteral("Control=Value"));
     const QCommandLineOption pressOption(QStringLiteral("press"),
                                          QStringLiteral("Press ok or cancel after the changes, then exit."),
                                          QStringLiteral("ok|cancel"));
@@ -122,7 +125,7 @@ int main(int argc, char** argv)
         return eBAD_COMMAND_LINE;
     }
     TaskSchedulerSettings::setBackend(scheduler == QLatin1String("cron") ? TaskSchedulerSettings::eCron
-                                                                          : TaskSchedulerSettings::eFiles);
+                                                                         : TaskSchedulerSettings::eFiles);
 
     const QString language = parser.value(languageOption);
     if (language != QLatin1String("en") && language != QLatin1String("fr"))

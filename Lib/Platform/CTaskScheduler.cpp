@@ -102,8 +102,7 @@ HRESULT CTaskScheduler::NewWorkItem(LPCWSTR pwszTaskName, REFCLSID rclsid, REFII
             if (!TaskFile::isValidName(name))
                 return E_INVALIDARG;
             struct stat info
-            {
-            };
+            {};
             if (::lstat(TaskFile::pathOf(name).c_str(), &info) == 0)
                 return HRESULT_FROM_WIN32(ERROR_FILE_EXISTS);
             *out = static_cast<ITask*>(CTask::create(name, newRecord()));

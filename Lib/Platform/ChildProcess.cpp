@@ -25,7 +25,11 @@ public:
     Fd& operator=(const Fd&) = delete;
 
     int get() const { return m_fd; }
-    int* out() { reset(); return &m_fd; }
+    int* out()
+    {
+        reset();
+        return &m_fd;
+    }
     void reset()
     {
         if (m_fd >= 0)

@@ -214,7 +214,8 @@ std::string CronTable::userOf(const TaskRecord& record)
 
 HRESULT CronTable::read(const std::string& user, std::string& table)
 {
-    const ChildProcess::Result result = ChildProcess::run(crontabCommand(user, "-l"), std::string(), kTimeoutMilliseconds);
+    const ChildProcess::Result result =
+        ChildProcess::run(crontabCommand(user, "-l"), std::string(), kTimeoutMilliseconds);
     if (result.startError == 0 && !result.timedOut && result.exitStatus == 1 &&
         result.errors.find("no crontab for") != std::string::npos)
     {

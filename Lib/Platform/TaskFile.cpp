@@ -311,7 +311,8 @@ HRESULT TaskFile::remove(const std::wstring& name)
     const HRESULT read = readFile(path, content);
     // A damaged file may go (an oversized one too, but never what is not a regular file); a
     // readable one only when it is the user's own.
-    struct stat info{};
+    struct stat info
+    {};
     const bool regular = ::lstat(path.c_str(), &info) == 0 && S_ISREG(info.st_mode);
     if (FAILED(read) && (read != SCHED_E_UNKNOWN_OBJECT_VERSION || !regular))
         return read;

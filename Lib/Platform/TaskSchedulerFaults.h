@@ -42,9 +42,9 @@ public:
     // What a faulted call hands out through its pointer out parameter.
     enum Output
     {
-        eAUTO,   // an object (the real one) on a success result, null on a failure result
-        eNULL,   // always null
-        eOBJECT  // always an object: the real one when the call can make it, else a blank one
+        eAUTO,  // an object (the real one) on a success result, null on a failure result
+        eNULL,  // always null
+        eOBJECT // always an object: the real one when the call can make it, else a blank one
     };
 
     struct Fault
@@ -90,8 +90,7 @@ public:
         if (out == nullptr)
             return fault->result;
         *out = nullptr;
-        const bool wantObject =
-            fault->output == eOBJECT || (fault->output == eAUTO && SUCCEEDED(fault->result));
+        const bool wantObject = fault->output == eOBJECT || (fault->output == eAUTO && SUCCEEDED(fault->result));
         if (wantObject)
         {
             T* object = nullptr;

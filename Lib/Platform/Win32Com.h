@@ -15,8 +15,7 @@ typedef uint64_t ULONGLONG;
 #define HRESULT_FACILITY(hr) (((hr) >> 16) & 0x1FFF)
 #define FACILITY_ITF 4
 #define FACILITY_WIN32 7
-#define MAKE_HRESULT(sev, fac, code) \
-    ((HRESULT)(((uint32_t)(sev) << 31) | ((uint32_t)(fac) << 16) | ((uint32_t)(code))))
+#define MAKE_HRESULT(sev, fac, code) ((HRESULT)(((uint32_t)(sev) << 31) | ((uint32_t)(fac) << 16) | ((uint32_t)(code))))
 
 // HRESULT of a Win32 error code: 0 stays 0, anything else becomes 0x8007xxxx.
 inline HRESULT HRESULT_FROM_WIN32(DWORD error)
@@ -86,8 +85,7 @@ class IUnknown;
 // Creates an object of one of this layer's classes (the task scheduler). CO_E_NOTINITIALIZED
 // outside an apartment, REGDB_E_CLASSNOTREG for an unknown class, E_NOINTERFACE for an
 // interface the class does not offer.
-TESSEL_EXPORT HRESULT CoCreateInstance(REFCLSID rclsid, IUnknown* outer, DWORD clsContext, REFIID riid,
-                                       LPVOID* ppv);
+TESSEL_EXPORT HRESULT CoCreateInstance(REFCLSID rclsid, IUnknown* outer, DWORD clsContext, REFIID riid, LPVOID* ppv);
 
 // Memory handed across interfaces (strings returned by tasks).
 TESSEL_EXPORT LPVOID CoTaskMemAlloc(size_t size);

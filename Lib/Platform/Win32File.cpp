@@ -139,10 +139,9 @@ errno_t _wsplitpath_s(const wchar_t* path, wchar_t* drive, size_t driveNumberOfE
         clearBuffer(fname, nameNumberOfElements);
         clearBuffer(ext, extNumberOfElements);
     };
-    const bool buffersValid = (drive == nullptr) == (driveNumberOfElements == 0) &&
-                              (dir == nullptr) == (dirNumberOfElements == 0) &&
-                              (fname == nullptr) == (nameNumberOfElements == 0) &&
-                              (ext == nullptr) == (extNumberOfElements == 0);
+    const bool buffersValid =
+        (drive == nullptr) == (driveNumberOfElements == 0) && (dir == nullptr) == (dirNumberOfElements == 0) &&
+        (fname == nullptr) == (nameNumberOfElements == 0) && (ext == nullptr) == (extNumberOfElements == 0);
     if (path == nullptr || !buffersValid)
     {
         clearAll();
@@ -170,8 +169,7 @@ errno_t _wsplitpath_s(const wchar_t* path, wchar_t* drive, size_t driveNumberOfE
 
     if (!copyPart(path, driveEnd, drive, driveNumberOfElements) ||
         !copyPart(rest, nameBegin, dir, dirNumberOfElements) ||
-        !copyPart(nameBegin, nameEnd, fname, nameNumberOfElements) ||
-        !copyPart(nameEnd, end, ext, extNumberOfElements))
+        !copyPart(nameBegin, nameEnd, fname, nameNumberOfElements) || !copyPart(nameEnd, end, ext, extNumberOfElements))
     {
         clearAll();
         errno = ERANGE;
@@ -180,8 +178,8 @@ errno_t _wsplitpath_s(const wchar_t* path, wchar_t* drive, size_t driveNumberOfE
     return 0;
 }
 
-errno_t _wmakepath_s(wchar_t* path, size_t sizeInWords, const wchar_t* drive, const wchar_t* dir,
-                     const wchar_t* fname, const wchar_t* ext)
+errno_t _wmakepath_s(wchar_t* path, size_t sizeInWords, const wchar_t* drive, const wchar_t* dir, const wchar_t* fname,
+                     const wchar_t* ext)
 {
     if (path == nullptr || sizeInWords == 0)
     {

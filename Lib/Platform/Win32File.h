@@ -79,9 +79,9 @@ TESSEL_EXPORT BOOL CreateDirectoryW(LPCWSTR pathName, SECURITY_ATTRIBUTES* secur
 // (with its dot). Each out buffer may be null with a size of 0. EINVAL for a null path or a
 // buffer whose pointer and size disagree, ERANGE when a part does not fit its buffer; on
 // failure every given buffer is emptied.
-TESSEL_EXPORT errno_t _wsplitpath_s(const wchar_t* path, wchar_t* drive, size_t driveNumberOfElements,
-                                    wchar_t* dir, size_t dirNumberOfElements, wchar_t* fname,
-                                    size_t nameNumberOfElements, wchar_t* ext, size_t extNumberOfElements);
+TESSEL_EXPORT errno_t _wsplitpath_s(const wchar_t* path, wchar_t* drive, size_t driveNumberOfElements, wchar_t* dir,
+                                    size_t dirNumberOfElements, wchar_t* fname, size_t nameNumberOfElements,
+                                    wchar_t* ext, size_t extNumberOfElements);
 
 // Joins drive, folder, file name and extension (each may be null or empty); a separator is
 // put after a folder without one, a dot before an extension without one. EINVAL for a null

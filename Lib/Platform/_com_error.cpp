@@ -52,7 +52,9 @@ constexpr Text kTexts[] = {
 };
 }
 
-_com_error::_com_error(HRESULT hr) : m_hr(hr) {}
+_com_error::_com_error(HRESULT hr) : m_hr(hr)
+{
+}
 
 HRESULT _com_error::Error() const
 {

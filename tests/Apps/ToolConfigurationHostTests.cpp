@@ -1,13 +1,13 @@
+#include "BEvent.h"
 #include "CDataManager.h"
 #include "CQ17FileSystemWatcher.h"
-#include "BEvent.h"
 #include "CustomEvent.h"
-#include "HostProblems.h"
 #include "DialogDrivers.h"
+#include "HostProblems.h"
 #include "LogCapture.h"
-#include "TesselLog_Static.h"
 #include "SettingsFiles.h"
 #include "TempDir.h"
+#include "TesselLog_Static.h"
 #include "ToolConfigurationDialog.h"
 #include "ToolConfigurationHost.h"
 
@@ -103,7 +103,8 @@ protected:
     void set(const char* control, const QString& value)
     {
         QString error;
-        EXPECT_TRUE(m_dialog->setFieldValue(QLatin1String(control), value, &error)) << control << ": " << error.toStdString();
+        EXPECT_TRUE(m_dialog->setFieldValue(QLatin1String(control), value, &error))
+            << control << ": " << error.toStdString();
     }
     void selectUser(int row)
     {
@@ -152,13 +153,14 @@ protected:
 
 TEST_F(HostTest, FieldsShowTheSettingsFilesAndTheConfiguration)
 {
-    EXPECT_EQ(m_dialog->summary().join('\n').toStdString(),
-              "Workshop: Harbour Lane Motors Ltd | Harbour Lane Motors | 14 Harbour Lane | PO1 3AX Portsmouth | tel +44 "
-              "23 9200 0104 | fax +44 23 9200 0105 | business number WS-104522 | brand Estrella\n"
-              "Online update: on | mode OTHER | folder /srv/updates/repository (editable) | daily at 07:30:00\n"
-              "App2App: server 192.168.10.20 port 8080 | dealer D-0457\n"
-              "Users (3): Alice Moreau, Ben Okafor, Chloé Dubois\n"
-              "Installation: United Kingdom | English | version 4.2.1 F1 | recording mode off");
+    EXPECT_EQ(
+        m_dialog->summary().join('\n').toStdString(),
+        "Workshop: Harbour Lane Motors Ltd | Harbour Lane Motors | 14 Harbour Lane | PO1 3AX Portsmouth | tel +44 "
+        "23 9200 0104 | fax +44 23 9200 0105 | business number WS-104522 | brand Estrella\n"
+        "Online update: on | mode OTHER | folder /srv/updates/repository (editable) | daily at 07:30:00\n"
+        "App2App: server 192.168.10.20 port 8080 | dealer D-0457\n"
+        "Users (3): Alice Moreau, Ben Okafor, Chloé Dubois\n"
+        "Installation: United Kingdom | English | version 4.2.1 F1 | recording mode off");
     EXPECT_EQ(text("Country"), "United Kingdom");
     EXPECT_TRUE(widget<QLineEdit>("Country")->isReadOnly());
     const auto* brands = widget<QComboBox>("BrandCombo");
@@ -189,12 +191,16 @@ TEST_F(HostTest, EditsMadeThroughTheWidgetsAreWrittenOnOK)
     // App2App mode points the folder at the server's repository share.
     set("A2ARadioButton", "1");
     EXPECT_EQ(text("DistributionFolderPath"), "\\\\192.168.10.20\\TLD_REPOSITORY");
-    const std::pair<const char*, const char*> edits[] = {
-        {"NameEdit", "Quayside Motors"},        {"TownPostCodeEdit_PostCode", "SO14 2AA"},
-        {"TownPostCodeEdit_Town", "Southampton"}, {"PhoneNumberEdit", "+44 23 8000 0001"},
-        {"BrandCombo", "Garrow"},               {"App2AppIP", "010.001.002.003"},
-        {"App2AppPort", "9090"},                {"TaskTimeEdit", "06:15:00"},
-        {"CheckInternet", "0"},                 {"LocalRadioButton", "1"}};
+    const std::pair<const char*, const char*> edits[] = {{"NameEdit", "Quayside Motors"},
+                                                         {"TownPostCodeEdit_PostCode", "SO14 2AA"},
+                                                         {"TownPostCodeEdit_Town", "Southampton"},
+                                                         {"PhoneNumberEdit", "+44 23 8000 0001"},
+                                                         {"BrandCombo", "Garrow"},
+                                                         {"App2AppIP", "010.001.002.003"},
+                                                         {"App2AppPort", "9090"},
+                                                         {"TaskTimeEdit", "06:15:00"},
+                                                         {"CheckInternet", "0"},
+                                                         {"LocalRadioButton", "1"}};
     for (const auto& [control, value] : edits)
         set(control, value);
     // The local mode fixes the folder: shown read-only, no browsing.
@@ -206,9 +212,11 @@ TEST_F(HostTest, EditsMadeThroughTheWidgetsAreWrittenOnOK)
     QApplication::processEvents();
     EXPECT_FALSE(m_dialog->isVisible()) << "OK closes the window through the mediator";
     EXPECT_EQ(TesselLog_Static::getLevel_static(), 0) << "no recording mode, no detailed log";
-    const std::pair<const char*, const char*> workshop[] = {
-        {"nom", "Quayside Motors"}, {"codepostal", "SO14 2AA"}, {"ville", "Southampton"},
-        {"telephone", "+44 23 8000 0001"}, {"default_brand", "12"}};
+    const std::pair<const char*, const char*> workshop[] = {{"nom", "Quayside Motors"},
+                                                            {"codepostal", "SO14 2AA"},
+                                                            {"ville", "Southampton"},
+                                                            {"telephone", "+44 23 8000 0001"},
+                                                            {"default_brand", "12"}};
     for (const auto& [key, value] : workshop)
         EXPECT_EQ(inFile(kWorkshopFile, key), value) << key;
     EXPECT_EQ(inFile(kUsersFile, "IP", "App2App"), "10.1.2.3");

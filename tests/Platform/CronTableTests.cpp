@@ -61,7 +61,8 @@ TEST(CronLine, ShapeAndRefusedFields)
     TaskRecord record = dailyTask(L"/opt/agent dir/agent.sh", L" preparer  50% ", 7, 5);
     record.triggers[0].Type.Daily.DaysInterval = 3;
     EXPECT_EQ(S_OK, CronTable::lineFor(L"Daily % 1", record, line));
-    EXPECT_EQ("5 7 */3 * * '/opt/agent dir/agent.sh' 'preparer' '50\\%' # ProcToolConfiguration task: Daily \\% 1", line);
+    EXPECT_EQ("5 7 */3 * * '/opt/agent dir/agent.sh' 'preparer' '50\\%' # ProcToolConfiguration task: Daily \\% 1",
+              line);
     for (const auto& [name, application, parameters] :
          {std::make_tuple(L"Daily", L"/bin/x", L"a\nb"), std::make_tuple(L"Daily", L"/bin/x\r", L""),
           std::make_tuple(L"Daily #2", L"/bin/x", L"")})

@@ -123,9 +123,14 @@ TEST_F(TaskSchedulerLayer, TriggersKeepTheirIdentityAndRefuseBadRecords)
     EXPECT_EQ(SCHED_E_TRIGGER_NOT_FOUND, triggers[0]->SetTrigger(&record));
     EXPECT_EQ(2, read(triggers[1].get()).wStartHour);
     using T = TASK_TRIGGER&;
-    void (*const mutations[])(T) = {[](T t) { t.cbTriggerSize = 40; }, [](T t) { t.wStartHour = 24; },
-        [](T t) { t.wStartMinute = 60; }, [](T t) { t.wBeginMonth = 13; }, [](T t) { t.wBeginDay = 0; },
-        [](T t) { t.Type.Daily.DaysInterval = 0; }, [](T t) { t.TriggerType = static_cast<TASK_TRIGGER_TYPE>(8); },
+    void (*const mutations[])(T) = {
+        [](T t) { t.cbTriggerSize = 40; },
+        [](T t) { t.wStartHour = 24; },
+        [](T t) { t.wStartMinute = 60; },
+        [](T t) { t.wBeginMonth = 13; },
+        [](T t) { t.wBeginDay = 0; },
+        [](T t) { t.Type.Daily.DaysInterval = 0; },
+        [](T t) { t.TriggerType = static_cast<TASK_TRIGGER_TYPE>(8); },
         [](T t) { t.TriggerType = TASK_TIME_TRIGGER_WEEKLY, t.Type.Weekly.WeeksInterval = 0; },
         [](T t) { t.rgFlags = TASK_TRIGGER_FLAG_HAS_END_DATE, t.wEndMonth = 1, t.wEndDay = 32; }};
     for (const auto mutate : mutations)
@@ -201,10 +206,10 @@ TEST(Win32Helpers, ErrorTextsLoginAndNumbers)
     EXPECT_STREQ("Unknown error 0x8007FFFF", _com_error(HRESULT(0x8007FFFFu)).ErrorMessage());
     EXPECT_STREQ("Unknown error 0x12345678", _com_error(HRESULT(0x12345678u)).ErrorMessage());
     wchar_t buffer[257] = {};
-    DWORD size = static_cast<DWORD>(EffectiveUser::loginName().length());  // one short
+    DWORD size = static_cast<DWORD>(EffectiveUser::loginName().length()); // one short
     EXPECT_FALSE(GetUserNameW(buffer, &size));
     EXPECT_EQ(DWORD(ERROR_INSUFFICIENT_BUFFER), GetLastError());
-    EXPECT_TRUE(GetUserNameW(buffer, &size));  // it told what it needs
+    EXPECT_TRUE(GetUserNameW(buffer, &size)); // it told what it needs
     EXPECT_FALSE(GetUserNameW(buffer, nullptr));
     EXPECT_EQ(DWORD(ERROR_INVALID_PARAMETER), GetLastError());
     EXPECT_EQ(INT_MAX, _wtoi(L"99999999999"));

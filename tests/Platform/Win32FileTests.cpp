@@ -27,7 +27,7 @@ TEST(SplitPath, SplitsIntoDriveFolderNameAndExtension)
 {
     EXPECT_EQ(split(L"c:\\REPOSITORY\\pkg.tar.gz"), L"c:|\\REPOSITORY\\|pkg.tar|.gz");
     EXPECT_EQ(split(L"dir.d/name"), L"|dir.d/|name|");
-    EXPECT_EQ(split(nullptr), L"error 22 |||");  // bad arguments leave every part empty
+    EXPECT_EQ(split(nullptr), L"error 22 |||"); // bad arguments leave every part empty
     // 259 characters fit a buffer of 260 with the terminator, 260 do not.
     const wstring fits = L"/" + wstring(257, L'd') + L"/";
     EXPECT_EQ(split((fits + L"f.x").c_str()), L"|" + fits + L"|f|.x");

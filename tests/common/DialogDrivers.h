@@ -44,8 +44,8 @@ protected:
         if (auto* result = dynamic_cast<Dialog_OnLineUpdateConfigurationTestResult*>(watched))
         {
             const size_t index = results.size();
-            results.push_back({result->preparerText(), result->taskText(),
-                               result->property("decoratorStyle").toString(), false});
+            results.push_back(
+                {result->preparerText(), result->taskText(), result->property("decoratorStyle").toString(), false});
             QTimer::singleShot(0, result, [this, result, index]() {
                 results[index].ranModally = QApplication::activeModalWidget() == result;
                 result->okButton()->click();

@@ -231,9 +231,9 @@ TEST(CrashTest, SavesKilledAtVariedPointsLeaveWholeFiles)
         const auto others = files.others();
         leftTemporary += !others.empty();
         for (const std::string& name : others)
-            EXPECT_TRUE(std::any_of(std::begin(kNames), std::end(kNames),
-                                    [&name](const char* target) { return SettingsFile::isTemporaryOf(name, target); }))
-                << name;
+            EXPECT_TRUE(std::any_of(std::begin(kNames), std::end(kNames), [&name](const char* target) {
+                return SettingsFile::isTemporaryOf(name, target);
+            })) << name;
     }
     std::cout << kills << " kills checked; " << leftTemporary << " of them left a temporary file (landed mid-save)\n";
 }

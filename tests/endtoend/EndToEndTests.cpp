@@ -15,8 +15,8 @@
 
 #include <pwd.h>
 #include <signal.h>
-#include <sys/stat.h>
 #include <spawn.h>
+#include <sys/stat.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
@@ -57,7 +57,8 @@ protected:
         m_command.reset();
         m_factory = std::make_unique<SmartProxy<PControllerFactoryBase>>();
         ASSERT_TRUE(m_factory->acquire(ID(Uri::kFactory)));
-        m_command.reset(dynamic_cast<ToolConfigurationCommand*>((*m_factory)->getControllerByName(L"WC_TOOLCONFIGURATION"_w)));
+        m_command.reset(
+            dynamic_cast<ToolConfigurationCommand*>((*m_factory)->getControllerByName(L"WC_TOOLCONFIGURATION"_w)));
         m_users.reset(dynamic_cast<UsersCommand*>((*m_factory)->getControllerByName(L"WC_USERSCOMMAND"_w)));
         ASSERT_NE(m_command, nullptr);
         ASSERT_NE(m_users, nullptr);
@@ -119,8 +120,8 @@ TEST_F(EndToEndTest, EditsThenOkWriteTheFilesAndTheTaskAndAReopenedDialogShowsTh
     EXPECT_EQ(TesselLog_Static::getLevel_static(), 10);
     EXPECT_EQ(text(Uri::kActivePreparateur), m_updatePath);
 
-    ScheduledTaskParams expectedTask(L"VEXAPreparerTask", L"C:/VEXA_Q17/Lib/Application/UpdaterAgent.exe",
-                                     L"preparer", L"21", L"15");
+    ScheduledTaskParams expectedTask(L"VEXAPreparerTask", L"C:/VEXA_Q17/Lib/Application/UpdaterAgent.exe", L"preparer",
+                                     L"21", L"15");
     CScheduledTaskHelper helper(expectedTask);
     EXPECT_EQ(helper.checkScheduledTask(), OnlineUpdateCommand_NS::eOK);
 
@@ -129,16 +130,25 @@ TEST_F(EndToEndTest, EditsThenOkWriteTheFilesAndTheTaskAndAReopenedDialogShowsTh
     m_command.reset();
     ASSERT_EQ(m_dataManager->removeData(ID(L"data:/Auto/SystemMenu"_w)), 0);
     openDialog();
-    const std::pair<const char*, const char*> expected[] = {
-        {"ProjectNumberEdit", "3|BN-99"}, {"CompanyNameEdit", "3|Garage de la Gare"}, {"NameEdit", "3|Żaneta Nowak"},
-        {"StreetEdit", "3|5 avenue Foch"}, {"TownPostCodeEdit", "3|75016|Paris"}, {"PhoneNumberEdit", "3|0111111111"},
-        {"FaxNumberEdit", "3|0122222222"}, {"BrandCombo", "3|Marque B"}, {"App2AppPort", "3|9090"},
-        {"App2AppIP", "3|10.0.0.42"}, {"App2AppDealerID", "3|D88"}, {"DistributionFolderPath", "3|/srv/new"}};
+    const std::pair<const char*, const char*> expected[] = {{"ProjectNumberEdit", "3|BN-99"},
+                                                            {"CompanyNameEdit", "3|Garage de la Gare"},
+                                                            {"NameEdit", "3|Żaneta Nowak"},
+                                                            {"StreetEdit", "3|5 avenue Foch"},
+                                                            {"TownPostCodeEdit", "3|75016|Paris"},
+                                                            {"PhoneNumberEdit", "3|0111111111"},
+                                                            {"FaxNumberEdit", "3|0122222222"},
+                                                            {"BrandCombo", "3|Marque B"},
+                                                            {"App2AppPort", "3|9090"},
+                                                            {"App2AppIP", "3|10.0.0.42"},
+                                                            {"App2AppDealerID", "3|D88"},
+                                                            {"DistributionFolderPath", "3|/srv/new"}};
     for (const auto& [name, shownText] : expected)
         EXPECT_EQ(shown(name), shownText) << name;
     EXPECT_EQ(SettingsFiles::stringAt(SettingsFiles::read(m_workshopPath), "default_brand"), "2");
     EXPECT_TRUE(flag("CheckInternet"));
-    EXPECT_EQ(std::string() + "01"[flag("LocalRadioButton")] + "01"[flag("A2ARadioButton")] + "01"[flag("OtherRadioButton")], "001");
+    EXPECT_EQ(std::string() + "01"[flag("LocalRadioButton")] + "01"[flag("A2ARadioButton")] +
+                  "01"[flag("OtherRadioButton")],
+              "001");
     EXPECT_EQ(text(Uri::kTaskTime), "21:15:00");
     EXPECT_EQ(SettingsFiles::usersIn(m_usersPath), (std::vector<User>{kBrunoChanged, kClara, kLukasz}));
     EXPECT_EQ(publishedUsers(*m_dataManager), (std::vector<User>{kBrunoChanged, kClara, kLukasz}));
@@ -249,7 +259,8 @@ TEST_F(EndToEndTest, OkSchedulesTheAgentInCronAndItRuns)
     EXPECT_EQ(taskLines(CronUser::table(user), &line), 1u);
     EXPECT_EQ(line.find(std::to_string(start.minute()) + " " + std::to_string(start.hour()) + " * * * '" +
                         agent.string() + "' 'preparer'"),
-              0u) << line;
+              0u)
+        << line;
 
     const auto deadline = std::chrono::steady_clock::now() + std::chrono::seconds(90);
     while (!std::filesystem::exists(log) && std::chrono::steady_clock::now() < deadline)

@@ -22,8 +22,9 @@ const ID kFactory(Uri::kFactory);
 TEST(EntryPoints, OnlyTheFactoryQueryMakesAComponentAndAProxy)
 {
     CToolConfigControllersFactory reference{kFactory};
-    for (const auto& [id, matches] : {std::pair("other:Library?ToolConfigControllersFactory", true), std::pair("proc:ProcToolConfiguration", false),
-                                      std::pair("proc:ProcToolConfiguration?toolconfigcontrollersfactory", false), std::pair("", false)})
+    for (const auto& [id, matches] :
+         {std::pair("other:Library?ToolConfigControllersFactory", true), std::pair("proc:ProcToolConfiguration", false),
+          std::pair("proc:ProcToolConfiguration?toolconfigcontrollersfactory", false), std::pair("", false)})
     {
         EXPECT_EQ(std::unique_ptr<IComponent>(createComponent(ID(id))) != nullptr, matches) << id;
         EXPECT_EQ(std::unique_ptr<ProxyComponent>(createProxy(ID(id), &reference)) != nullptr, matches) << id;
@@ -35,7 +36,8 @@ TEST(Factory, KnownNamesGiveNewControllers)
 {
     CToolConfigControllersFactory factory{kFactory};
     PToolConfigControllersFactory proxy(&factory);
-    for (const auto& [name, className] : {std::pair("WC_TOOLCONFIGURATION", "ToolConfigurationCommand"), std::pair("WC_USERSCOMMAND", "UsersCommand")})
+    for (const auto& [name, className] :
+         {std::pair("WC_TOOLCONFIGURATION", "ToolConfigurationCommand"), std::pair("WC_USERSCOMMAND", "UsersCommand")})
     {
         const Controller first(factory.getControllerByName(wide(name))), second(proxy.getControllerByName(wide(name)));
         ASSERT_TRUE(first && second && first.get() != second.get()) << name;
@@ -48,14 +50,16 @@ TEST(Factory, KnownNamesGiveNewControllers)
 TEST(Proxy, AnswersNullForAnotherComponentClassOrOnceItsComponentIsDestroyed)
 {
     CComponent_Thread_NoRef other{ID("other:Library?Other")};
-    EXPECT_EQ(Controller(PToolConfigControllersFactory(&other).getControllerByName(L"WC_TOOLCONFIGURATION"_w)), nullptr);
+    EXPECT_EQ(Controller(PToolConfigControllersFactory(&other).getControllerByName(L"WC_TOOLCONFIGURATION"_w)),
+              nullptr);
     CToolConfigControllersFactory factory{kFactory};
     PToolConfigControllersFactory proxy(&factory);
     LogCapture log;
     proxy.handleEvent(EventDestroyingComponent(ID("tessel:DM?DataManager"))); // another component's
     EXPECT_NE(Controller(proxy.getControllerByName(L"WC_TOOLCONFIGURATION"_w)), nullptr);
     proxy.handleEvent(EventDestroyingComponent(kFactory));
-    EXPECT_TRUE(Controller(proxy.getControllerByName(L"WC_TOOLCONFIGURATION"_w)) == nullptr && !log.containsSubstring("m_pComp is 0"));
+    EXPECT_TRUE(Controller(proxy.getControllerByName(L"WC_TOOLCONFIGURATION"_w)) == nullptr &&
+                !log.containsSubstring("m_pComp is 0"));
     proxy.handleEvent(EventDestroyingComponent(kFactory));
     EXPECT_TRUE(log.containsSubstring("m_pComp is 0", TesselLog_Static::eWARNING));
 }
@@ -67,7 +71,8 @@ TEST(Manager, LoadsThePlugInByItsIdentifierAndCutsItsProxyOffOnDestruction)
         manager->setLibraryPath(bin);
     SmartProxy<PControllerFactoryBase> factory;
     ASSERT_TRUE(factory.acquire(kFactory));
-    ASSERT_TRUE(dynamic_cast<PToolConfigControllersFactory*>(factory.get()) && manager->destroyComponent(kFactory) == 0);
+    ASSERT_TRUE(dynamic_cast<PToolConfigControllersFactory*>(factory.get()) &&
+                manager->destroyComponent(kFactory) == 0);
     EXPECT_EQ(Controller(factory->getControllerByName(L"WC_TOOLCONFIGURATION"_w)), nullptr);
     factory.giveBack();
     manager->destroyAllComponents();
@@ -93,13 +98,15 @@ TEST(CustomEventHandler, ReceivesPostedEventsWhileRegisteredAndLogsRefusals)
     CountingHandler handler;
     ASSERT_EQ(handler.Register(id), 0);
     EXPECT_EQ(post("processing:Test?Handler") + post("processing:Test?Other"), 1);
-    EXPECT_TRUE(handler.Register(id) != 0 && handler.isRegistered() && handler.registeredID() == id); // the first one stays
+    EXPECT_TRUE(handler.Register(id) != 0 && handler.isRegistered() &&
+                handler.registeredID() == id); // the first one stays
     ASSERT_EQ(handler.unregister(id), 0);
     EXPECT_TRUE(handler.unregister(id) != 0 && !handler.isRegistered());
     EXPECT_TRUE(post("processing:Test?Handler") == 0 && handler.received == 1);
     EXPECT_EQ(log.messages(TesselLog_Static::eERROR).size(), 2u);
     std::make_unique<CountingHandler>()->Register(ID("processing:Test?Dangling"));
-    EXPECT_TRUE(log.containsSubstring("~Handler being destructed while still registered to 'processing:Test?Dangling'"));
+    EXPECT_TRUE(
+        log.containsSubstring("~Handler being destructed while still registered to 'processing:Test?Dangling'"));
     EXPECT_EQ(post("processing:Test?Dangling"), 0);
 }
 }

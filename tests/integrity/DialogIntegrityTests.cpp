@@ -1,8 +1,8 @@
 #include "BBool.h"
 #include "CScheduledTaskHelper.h"
-#include "Dialog_ConfigurationTestBase.h"
 #include "DialogDrivers.h"
 #include "DialogFixture.h"
+#include "Dialog_ConfigurationTestBase.h"
 #include "EffectiveUser.h"
 #include "LogCapture.h"
 #include "OnLineUpdateCommand.h"
@@ -138,8 +138,7 @@ struct TaskTimeCase
 };
 
 class TaskTimeTest : public ComponentFixture, public ::testing::WithParamInterface<TaskTimeCase>
-{
-};
+{};
 
 // Only hh:mm or hh:mm:ss within the day make a task; anything else gives the invalid defaults
 // and an error line that shows the text as it is, never as a format.
@@ -227,7 +226,8 @@ TEST_F(ConfigurationTestIntegrity, ClosingTheWaitDialogAnyWayCancelsTheTest)
 {
     const std::pair<const char*, std::function<void(Dialog_ConfigurationTestBase&)>> ways[] = {
         {"cancel button", [](Dialog_ConfigurationTestBase& d) { d.cancelButton()->click(); }},
-        {"escape", [](Dialog_ConfigurationTestBase& d) {
+        {"escape",
+         [](Dialog_ConfigurationTestBase& d) {
              QKeyEvent escape(QEvent::KeyPress, Qt::Key_Escape, Qt::NoModifier);
              QApplication::sendEvent(&d, &escape);
          }},

@@ -43,13 +43,12 @@ struct EncodingCase
 {
     const char* name;
     std::string bytes;
-    const char* expected;      // the name read, or "<not loaded>"
-    const char* logged;        // part of the warning, when refused
+    const char* expected; // the name read, or "<not loaded>"
+    const char* logged;   // part of the warning, when refused
 };
 
 class EncodingTest : public ::testing::TestWithParam<EncodingCase>
-{
-};
+{};
 
 // A declared encoding is honoured; an undeclared file with bytes that are not UTF-8 is refused
 // with the offset of the first bad byte, and never overwritten.
@@ -206,9 +205,18 @@ TEST(NumberTest, OnlyAsciiDigitsCount)
     {
         const wchar_t* text;
         int value;
-    } cases[] = {{L"1", 1},        {L"\u0131", 0}, {L"\u0661", 0},        {L" 12x", 12},
-                 {L"-5", -5},      {L"+7", 7},      {L"", 0},               {L"99999999999", INT_MAX},
-                 {L"-99999999999", INT_MIN}, {L"\u0130" L"1", 0}};
+    } cases[] = {{L"1", 1},
+                 {L"\u0131", 0},
+                 {L"\u0661", 0},
+                 {L" 12x", 12},
+                 {L"-5", -5},
+                 {L"+7", 7},
+                 {L"", 0},
+                 {L"99999999999", INT_MAX},
+                 {L"-99999999999", INT_MIN},
+                 {L"\u0130"
+                  L"1",
+                  0}};
     for (const auto& c : cases)
     {
         SCOPED_TRACE(utf8(ACE_WString(c.text)));

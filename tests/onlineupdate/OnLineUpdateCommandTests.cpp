@@ -3,8 +3,8 @@
 #include "BBool.h"
 #include "CProcStartUpdateAgent.h"
 #include "ComponentFixture.h"
-#include "Dialog_ConfigurationTestBase.h"
 #include "DialogDrivers.h"
+#include "Dialog_ConfigurationTestBase.h"
 #include "EffectiveUser.h"
 #include "LogCapture.h"
 #include "SettingsFiles.h"
@@ -76,7 +76,10 @@ protected:
         ComponentFixture::TearDown();
     }
 
-    void setEnabled(bool enabled) { ASSERT_EQ(0, m_dataManager->createData(ID(Uri::kEnableOnlineUpdate), BBool(enabled))); }
+    void setEnabled(bool enabled)
+    {
+        ASSERT_EQ(0, m_dataManager->createData(ID(Uri::kEnableOnlineUpdate), BBool(enabled)));
+    }
 
     // The default task as the scheduler stores it for this user.
     static std::wstring storedName() { return L"VEXAPreparerTask_" + EffectiveUser::loginName(); }
@@ -184,7 +187,8 @@ TEST_F(OnlineUpdateFixture, MissingTaskTimeIsPublishedByOneInitialisationAttempt
     SettingsFiles::writeUpdate(m_dir.file("User/OnLineUpdate/Preparateur.xml"), update);
     EXPECT_EQ(utf8(getScheduledTaskParamsFromDM().startMinute()), "45");
     EXPECT_TRUE(m_log.contains("getScheduledTaskParamsFromDM: uri 'data:/Auto/SystemMenu/TaskTimeEdit' does not "
-                               "exist or empty - will attempt to init", kWarning));
+                               "exist or empty - will attempt to init",
+                               kWarning));
 }
 
 // ---- Checking the task as the settings ask ----
@@ -193,17 +197,16 @@ struct CheckCase
 {
     const char* name;
     bool enabled;
-    bool taskBefore;  // the task stored as set
-    TaskSchedulerFaults::Call fault;  // eCALL_COUNT: none, with S_FALSE: the scheduler service stopped
+    bool taskBefore;                 // the task stored as set
+    TaskSchedulerFaults::Call fault; // eCALL_COUNT: none, with S_FALSE: the scheduler service stopped
     HRESULT faultResult;
     _enum_CheckConfigurationScheduledTaskResult expected;
-    const char* line;  // what the check itself logs, if anything
+    const char* line; // what the check itself logs, if anything
     bool taskAfter;
 };
 
 class CheckTest : public OnlineUpdateFixture, public ::testing::WithParamInterface<CheckCase>
-{
-};
+{};
 
 // Online updates enabled, the task stays (made when missing); disabled, none is left behind.
 TEST_P(CheckTest, ResultTaskAndLogFollowTheSettings)

@@ -30,8 +30,14 @@ TEST_F(ScheduledTaskTest, InvalidParamsAreRejectedFirst)
 // one daily trigger; creating over an absent task is in AvailabilityForTheCurrentUser.
 TEST_F(ScheduledTaskTest, CreateOverExistingTaskReplacesItUnlessItMustFail)
 {
-    writeTask({L"/old/app", L"old", user(), L"", 0x4, SCHED_S_TASK_HAS_NOT_RUN,
-               {trigger(TASK_TIME_TRIGGER_WEEKLY, 1, 0), trigger(TASK_TIME_TRIGGER_DAILY, 2, 0), trigger(TASK_TIME_TRIGGER_ONCE, 3, 0)}});
+    writeTask({L"/old/app",
+               L"old",
+               user(),
+               L"",
+               0x4,
+               SCHED_S_TASK_HAS_NOT_RUN,
+               {trigger(TASK_TIME_TRIGGER_WEEKLY, 1, 0), trigger(TASK_TIME_TRIGGER_DAILY, 2, 0),
+                trigger(TASK_TIME_TRIGGER_ONCE, 3, 0)}});
     const std::string before = TempDir::read(taskPath());
     EXPECT_FALSE(m_helper.createScheduledTask(true));
     EXPECT_EQ(TempDir::read(taskPath()), before);
@@ -49,13 +55,15 @@ TEST_F(ScheduledTaskTest, CreateOverExistingTaskReplacesItUnlessItMustFail)
 
 TEST_F(ScheduledTaskTest, DeleteIsToleratedUnlessItMustFail)
 {
-    const std::string failed = "deleteScheduledTask: ITSPtr->Delete('" + stored() + "') failed with HRESULT '0x80070002' ('No such file or directory'), ";
+    const std::string failed = "deleteScheduledTask: ITSPtr->Delete('" + stored() +
+                               "') failed with HRESULT '0x80070002' ('No such file or directory'), ";
     writeTask(goodRecord());
     EXPECT_TRUE(m_helper.deleteScheduledTask(true));
     EXPECT_FALSE(std::filesystem::exists(taskPath()));
     EXPECT_TRUE(m_helper.deleteScheduledTask(false));
     EXPECT_FALSE(m_helper.deleteScheduledTask(true));
-    EXPECT_TRUE(m_log.containsSubstring(failed + "but failIfNotExists is not set") && m_log.containsSubstring(failed + "and failIfNotExists is set"));
+    EXPECT_TRUE(m_log.containsSubstring(failed + "but failIfNotExists is not set") &&
+                m_log.containsSubstring(failed + "and failIfNotExists is set"));
 }
 
 TEST_F(ScheduledTaskTest, AvailabilityForTheCurrentUser)
@@ -66,8 +74,10 @@ TEST_F(ScheduledTaskTest, AvailabilityForTheCurrentUser)
     writeTask(goodRecord(), "someoneelse");
     m_log.clear();
     EXPECT_EQ(run(m_helper, kAvailable), 1 + 4); // denied
-    EXPECT_TRUE(m_log.contains("getExistingTask: rTaskSchedPtr->Activate('" + stored() + "') failed with HRESULT '0x80070005' "
-                               "('Permission denied') - most likely tasks exists but we don't have privileges to access it"));
+    EXPECT_TRUE(
+        m_log.contains("getExistingTask: rTaskSchedPtr->Activate('" + stored() +
+                       "') failed with HRESULT '0x80070005' "
+                       "('Permission denied') - most likely tasks exists but we don't have privileges to access it"));
     TempDir::write(taskPath(), "<Task version=\"1\"");
     EXPECT_EQ(run(m_helper, kAvailable), 0); // damaged
 }
@@ -88,7 +98,8 @@ TEST_F(ScheduledTaskTest, SchedulerServiceRunningOrWhyNot)
         TaskSchedulerSettings::setServiceState(state);
         m_log.clear();
         EXPECT_EQ(CScheduledTaskHelper::checkSchedulerServiceRunning(), line.empty()) << line;
-        EXPECT_EQ(m_log.messages(), line.empty() ? Lines() : Lines{"CScheduledTaskHelper::checkSchedulerServiceRunning: " + line});
+        EXPECT_EQ(m_log.messages(),
+                  line.empty() ? Lines() : Lines{"CScheduledTaskHelper::checkSchedulerServiceRunning: " + line});
     }
 }
 

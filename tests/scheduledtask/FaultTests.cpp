@@ -31,18 +31,26 @@ const std::tuple<Op, F::Call, HRESULT, int, const char*, F::Output, int> kCases[
     {kCreate, F::eTriggerSetTrigger, E_INVALIDARG, 0, "SetTrigger failed", F::eAUTO, 0},
     {kCreate, F::eQueryInterface, E_NOINTERFACE, 0, "QueryInterface(IID_IPersistFile) failed", F::eAUTO, 0},
     {kCreate, F::eQueryInterface, S_OK, 0, "QueryInterface(IID_IPersistFile) OK but", F::eAUTO, 0},
-    {kCreate, F::eSave, static_cast<HRESULT>(0x80070070), 0, "Save failed with HRESULT '0x80070070' ('No space left", F::eAUTO, 0},
-    {kDelete, F::eCoCreateInstance, E_FAIL, 0, "deleteScheduledTask: CoCreateInstance(CLSID_CTaskScheduler) failed", F::eAUTO, 0},
-    {kDelete, F::eCoCreateInstance, S_OK, 0, "deleteScheduledTask:CoCreateInstance(CLSID_CTaskScheduler) was OK", F::eAUTO, 0},
+    {kCreate, F::eSave, static_cast<HRESULT>(0x80070070), 0, "Save failed with HRESULT '0x80070070' ('No space left",
+     F::eAUTO, 0},
+    {kDelete, F::eCoCreateInstance, E_FAIL, 0, "deleteScheduledTask: CoCreateInstance(CLSID_CTaskScheduler) failed",
+     F::eAUTO, 0},
+    {kDelete, F::eCoCreateInstance, S_OK, 0, "deleteScheduledTask:CoCreateInstance(CLSID_CTaskScheduler) was OK",
+     F::eAUTO, 0},
     {kAvailable, F::eCoCreateInstance, E_FAIL, 0, "CoCreateInstance(CLSID_CTaskScheduler) failed", F::eAUTO, 0},
     {kAvailable, F::eCoCreateInstance, S_OK, 0, "CoCreateInstance(CLSID_CTaskScheduler) was OK but", F::eAUTO, 0},
-    {kCheck, F::eCoInitialize, RPC_E_CHANGED_MODE, kNoService, "HRESULT '0x800401F0' ('CoInitialize has not been called.')", F::eAUTO, 0},
+    {kCheck, F::eCoInitialize, RPC_E_CHANGED_MODE, kNoService,
+     "HRESULT '0x800401F0' ('CoInitialize has not been called.')", F::eAUTO, 0},
     {kCheck, F::eCoCreateInstance, S_OK, kNoService, "CoCreateInstance(CLSID_CTaskScheduler) OK but", F::eAUTO, 0},
     {kCheck, F::eActivate, S_OK, kNoService, "returns S_OK but rTaskPtr is NULL", F::eAUTO, 0},
-    {kCheck, F::eActivate, static_cast<HRESULT>(0x80070002), kNoService, "COR_E_FILENOTFOUND but rTaskPtr is not NULL", F::eOBJECT, 0},
-    {kCheck, F::eActivate, E_ACCESSDENIED, eOK, "most likely tasks exists", F::eOBJECT, 0}, // the task handed out is checked
-    {kCheck, F::eActivate, SCHED_E_UNKNOWN_OBJECT_VERSION, kNoService, "failed with documented HRESULT '0x80041313'", F::eAUTO, 0},
-    {kCheck, F::eActivate, E_FAIL, kNoService, "failed with undocumented HRESULT '0x80004005' ('Unspecified error.')", F::eAUTO, 0},
+    {kCheck, F::eActivate, static_cast<HRESULT>(0x80070002), kNoService, "COR_E_FILENOTFOUND but rTaskPtr is not NULL",
+     F::eOBJECT, 0},
+    {kCheck, F::eActivate, E_ACCESSDENIED, eOK, "most likely tasks exists", F::eOBJECT,
+     0}, // the task handed out is checked
+    {kCheck, F::eActivate, SCHED_E_UNKNOWN_OBJECT_VERSION, kNoService, "failed with documented HRESULT '0x80041313'",
+     F::eAUTO, 0},
+    {kCheck, F::eActivate, E_FAIL, kNoService, "failed with undocumented HRESULT '0x80004005' ('Unspecified error.')",
+     F::eAUTO, 0},
     {kCheck, F::eGetStatus, S_FALSE, kUnknown, "GetStatus failed with HRESULT '0x1'", F::eAUTO, 0},
     {kCheck, F::eGetFlags, E_FAIL, kUnknown, "GetFlags failed", F::eAUTO, 0},
     {kCheck, F::eGetParameters, E_FAIL, kUnknown, "GetParameters failed", F::eAUTO, 0},
@@ -52,7 +60,8 @@ const std::tuple<Op, F::Call, HRESULT, int, const char*, F::Output, int> kCases[
     {kCheck, F::eGetTrigger, SCHED_E_TRIGGER_NOT_FOUND, kUnknown, "task->GetTrigger failed", F::eAUTO, 0},
     {kCheck, F::eGetTrigger, S_OK, kUnknown, "GetTrigger OK but", F::eAUTO, 0},
     // The record read is not examined: a failed read leaves it zero, which is not daily.
-    {kCheck, F::eTriggerGetTrigger, E_FAIL, eWRONG_SETTINGS, "unexpected (not daily) trigger settings '0'", F::eAUTO, 0},
+    {kCheck, F::eTriggerGetTrigger, E_FAIL, eWRONG_SETTINGS, "unexpected (not daily) trigger settings '0'", F::eAUTO,
+     0},
 };
 
 TEST_F(ScheduledTaskTest, EachFaultGivesItsResultAndLineAndLeavesTheTaskAsItWas)
@@ -83,7 +92,8 @@ TEST_F(ScheduledTaskTest, GetExistingTaskReleasesWhatItHeldAndChecksItsInputs)
     ASSERT_EQ(CoInitialize(nullptr), S_OK);
     void* scheduler = nullptr;
     IUnknown* held = nullptr;
-    ASSERT_EQ(CoCreateInstance(CLSID_CTaskScheduler, nullptr, CLSCTX_INPROC_SERVER, IID_ITaskScheduler, &scheduler), S_OK);
+    ASSERT_EQ(CoCreateInstance(CLSID_CTaskScheduler, nullptr, CLSCTX_INPROC_SERVER, IID_ITaskScheduler, &scheduler),
+              S_OK);
     ComPtr<ITaskScheduler> owner(static_cast<ITaskScheduler*>(scheduler));
     ASSERT_EQ(owner->Activate(storedName().c_str(), IID_ITask, &held), S_OK);
     held->AddRef();
@@ -93,7 +103,8 @@ TEST_F(ScheduledTaskTest, GetExistingTaskReleasesWhatItHeldAndChecksItsInputs)
     EXPECT_TRUE(task == nullptr && !denied);
     EXPECT_EQ(held->Release(), 0u); // the function released the other reference
     EXPECT_FALSE(getExistingTask(owner.get(), ScheduledTaskParams::s_defaultParams, task, denied));
-    EXPECT_EQ(m_log.messages(16), (Lines{"getExistingTask: rTaskSchedPtr is NULL", "getExistingTask: rParams is not valid"}));
+    EXPECT_EQ(m_log.messages(16),
+              (Lines{"getExistingTask: rTaskSchedPtr is NULL", "getExistingTask: rParams is not valid"}));
     owner.reset(), CoUninitialize();
 }
 }

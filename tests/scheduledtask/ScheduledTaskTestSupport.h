@@ -21,7 +21,13 @@ using Faults = TaskSchedulerFaults;
 using Lines = std::vector<std::string>;
 
 const wchar_t kApp[] = L"/opt/agent/UpdaterAgent";
-enum Op { kCreate, kDelete, kAvailable, kCheck };
+enum Op
+{
+    kCreate,
+    kDelete,
+    kAvailable,
+    kCheck
+};
 
 // Each test gets its own tasks folder, a log capture and a helper for the task "UpdTask" running
 // kApp with "preparer" daily at 07:05.
@@ -57,7 +63,8 @@ public:
     }
 
     // Starting on 2024-03-14, every day or week.
-    static TASK_TRIGGER trigger(TASK_TRIGGER_TYPE type, WORD hour, WORD minute, WORD year = 2024, WORD month = 3, WORD day = 14)
+    static TASK_TRIGGER trigger(TASK_TRIGGER_TYPE type, WORD hour, WORD minute, WORD year = 2024, WORD month = 3,
+                                WORD day = 14)
     {
         TASK_TRIGGER t;
         std::memset(&t, 0, sizeof t);
@@ -71,7 +78,12 @@ public:
     // A task record as the helper writes it for the standard parameters.
     static TaskRecord goodRecord()
     {
-        return {kApp, L"preparer", user(), L"", TASK_FLAG_INTERACTIVE | TASK_FLAG_RUN_ONLY_IF_LOGGED_ON, SCHED_S_TASK_HAS_NOT_RUN,
+        return {kApp,
+                L"preparer",
+                user(),
+                L"",
+                TASK_FLAG_INTERACTIVE | TASK_FLAG_RUN_ONLY_IF_LOGGED_ON,
+                SCHED_S_TASK_HAS_NOT_RUN,
                 {trigger(TASK_TIME_TRIGGER_DAILY, 7, 5)}};
     }
 

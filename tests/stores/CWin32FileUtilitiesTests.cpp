@@ -9,10 +9,20 @@ namespace
 {
 TEST(ParentFolderName, IsDriveAndFolderWithoutTrailingSeparatorOrEmpty)
 {
-    const auto parentOf = [](const std::wstring& path) { return utf8(CWin32FileUtilities::getParentFolderName(path.c_str())); };
-    const std::pair<const char*, const char*> cases[] = {
-        {"../../Data/User/InformationsGarage.xml", "../../Data/User"}, {"C:/Data/", "C:/Data"}, {"C:/Data", "C:"}, {"C:\\Data\\", "C:\\Data"},
-        {"C:\\Data\\Sub\\file.xml", "C:\\Data\\Sub"}, {"C:", "C:"}, {"InformationsGarage.xml", ""}, {"/", ""}, {"/tmp", ""}, {"/tmp/x", "/tmp"}, {"", ""}};
+    const auto parentOf = [](const std::wstring& path) {
+        return utf8(CWin32FileUtilities::getParentFolderName(path.c_str()));
+    };
+    const std::pair<const char*, const char*> cases[] = {{"../../Data/User/InformationsGarage.xml", "../../Data/User"},
+                                                         {"C:/Data/", "C:/Data"},
+                                                         {"C:/Data", "C:"},
+                                                         {"C:\\Data\\", "C:\\Data"},
+                                                         {"C:\\Data\\Sub\\file.xml", "C:\\Data\\Sub"},
+                                                         {"C:", "C:"},
+                                                         {"InformationsGarage.xml", ""},
+                                                         {"/", ""},
+                                                         {"/tmp", ""},
+                                                         {"/tmp/x", "/tmp"},
+                                                         {"", ""}};
     for (const auto& [path, parent] : cases)
         EXPECT_EQ(parentOf(wide(path).c_str()), parent) << path;
     // An unsplittable path is logged, a too long result is empty.
@@ -34,14 +44,17 @@ TEST(FolderTree, CreatesMissingAncestorsUnlessAFileIsInTheWay)
     TempDir dir;
     const auto previous = std::filesystem::current_path();
     std::filesystem::current_path(dir.path());
-    EXPECT_TRUE(CWin32FileUtilities::createFolderTree(L"a/b\\c/d") && CWin32FileUtilities::createFolderTree(L"a/b/c/e/"));
+    EXPECT_TRUE(CWin32FileUtilities::createFolderTree(L"a/b\\c/d") &&
+                CWin32FileUtilities::createFolderTree(L"a/b/c/e/"));
     EXPECT_TRUE(std::filesystem::is_directory("a/b/c/d") && std::filesystem::is_directory("a/b/c/e"));
     EXPECT_FALSE(CWin32FileUtilities::createFolderTree(L"") || CWin32FileUtilities::createFolderTree(nullptr));
     TempDir::write("a/file", "x");
-    EXPECT_FALSE(CWin32FileUtilities::createFolderTree(L"a/file/b/c") || CWin32FileUtilities::createFolderTree(L"a/file"));
+    EXPECT_FALSE(CWin32FileUtilities::createFolderTree(L"a/file/b/c") ||
+                 CWin32FileUtilities::createFolderTree(L"a/file"));
     // "Q:" is its own parent; a file named so plays the drive that cannot be made.
     std::ofstream("Q:") << "x";
-    EXPECT_FALSE(CWin32FileUtilities::createFolderTree(L"Q:/Data/User") || CWin32FileUtilities::createFolderTree(L"Q:"));
+    EXPECT_FALSE(CWin32FileUtilities::createFolderTree(L"Q:/Data/User") ||
+                 CWin32FileUtilities::createFolderTree(L"Q:"));
     // "sub/.." names a folder only once "sub" exists; the walk makes it on the way.
     EXPECT_TRUE(CWin32FileUtilities::createParentFolder(L"sub/../Other/User/file.xml"));
     EXPECT_TRUE(std::filesystem::is_directory("Other/User") && !std::filesystem::exists("Other/User/file.xml"));

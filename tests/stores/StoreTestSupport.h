@@ -22,7 +22,10 @@ inline std::string typed(const std::string& type, const std::string& key, const 
 {
     return "<" + type + " key=\"" + key + "\">" + value + "</" + type + ">";
 }
-inline std::string str(const std::string& key, const std::string& value) { return typed("String", key, value); }
+inline std::string str(const std::string& key, const std::string& value)
+{
+    return typed("String", key, value);
+}
 
 // A temporary folder, a log capture, and a store of type Store on a settings file in it.
 template <class Store, class Base = ::testing::Test>

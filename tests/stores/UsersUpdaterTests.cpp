@@ -16,7 +16,8 @@ std::string users(const std::vector<std::string>& names)
     std::string list;
     for (size_t i = 0; i < names.size(); ++i)
         if (names[i] != "-")
-            list += typed("Set", "user" + std::to_string(i + 1), str("name", names[i]) + str("address", "addr") + str("telephone", "tel"));
+            list += typed("Set", "user" + std::to_string(i + 1),
+                          str("name", names[i]) + str("address", "addr") + str("telephone", "tel"));
     return typed("Set", "users", list);
 }
 
@@ -24,10 +25,11 @@ std::string users(const std::vector<std::string>& names)
 std::string app2App(UsersUpdater& store)
 {
     const BSet attributes = store.getApp2AppReqAttrs();
-    return utf8(store.getApp2AppPort() + L" | "_w + store.getApp2AppIP() + L" | "_w + store.getApp2AppDealerID()) + " | " +
-           std::to_string(store.getApp2AppNumRetries()) + " " + std::to_string(store.getApp2AppTimeout()) + " | " +
-           SettingsFiles::stringAt(attributes, "application") + " " + SettingsFiles::stringAt(attributes, "service") +
-           " " + SettingsFiles::stringAt(attributes, "dealerId") + " (" + std::to_string(attributes.size()) + ")";
+    return utf8(store.getApp2AppPort() + L" | "_w + store.getApp2AppIP() + L" | "_w + store.getApp2AppDealerID()) +
+           " | " + std::to_string(store.getApp2AppNumRetries()) + " " + std::to_string(store.getApp2AppTimeout()) +
+           " | " + SettingsFiles::stringAt(attributes, "application") + " " +
+           SettingsFiles::stringAt(attributes, "service") + " " + SettingsFiles::stringAt(attributes, "dealerId") +
+           " (" + std::to_string(attributes.size()) + ")";
 }
 
 // Activation is the leading integer, written as "1" or "0".
@@ -36,7 +38,8 @@ TEST_F(UsersUpdaterTest, MissingApp2AppGetsDefaultsAndActivationIsOneOrZero)
     UsersUpdater& store = loaded(str("activation", "12abc"));
     EXPECT_TRUE(store.getUserCount() == 0 && store.isActivated()); // no users set at all
     EXPECT_EQ(app2App(store), " |  |  | 3 3.000000 | vexa sfd  (2)");
-    EXPECT_TRUE(store.setApp2AppParams(L"9000"_w, L"10.1.2.3"_w, wide("Händler-7")) && store.activate(false) && store.save());
+    EXPECT_TRUE(store.setApp2AppParams(L"9000"_w, L"10.1.2.3"_w, wide("Händler-7")) && store.activate(false) &&
+                store.save());
     EXPECT_EQ(app2App(reread()), "9000 | 10.1.2.3 | Händler-7 | 3 3.000000 | vexa sfd Händler-7 (3)");
     EXPECT_EQ(SettingsFiles::stringAt(SettingsFiles::read(path()), "activation"), "0");
     EXPECT_FALSE(m_store->isActivated() || loaded("").isActivated());
@@ -54,7 +57,8 @@ TEST_F(UsersUpdaterTest, CountsConsecutiveUsedSlotsAndAddsAfterThem)
         UsersUpdater& store = loaded(users({"Anna", gap, "Carl"}));
         EXPECT_EQ(store.getUserCount(), 1u) << gap;
         ASSERT_TRUE(store.addUser(L"Neu"_w, L"Rue 1"_w, L"0102"_w));
-        EXPECT_EQ(utf8(store.getUserName(1) + store.getUserAddress(1) + store.getUserPhone(1) + store.getUserName(2)), "NeuRue 10102Carl");
+        EXPECT_EQ(utf8(store.getUserName(1) + store.getUserAddress(1) + store.getUserPhone(1) + store.getUserName(2)),
+                  "NeuRue 10102Carl");
         EXPECT_EQ(store.getUserCount(), 3u) << gap; // the filled gap joins the used slot after it
     }
 }
@@ -86,7 +90,8 @@ TEST_F(UsersUpdaterTest, TwentyUsersIsTheLimit)
     UsersUpdater& store = loaded(users(names));
     EXPECT_EQ(store.getUserCount(), 20u);
     EXPECT_FALSE(store.addUser(L"Extra"_w, L"a"_w, L"p"_w));
-    EXPECT_EQ(utf8(store.getUserName(19) + store.getUserName(20) + store.getUserAddress(20) + store.getUserPhone(20)), "user20");
+    EXPECT_EQ(utf8(store.getUserName(19) + store.getUserName(20) + store.getUserAddress(20) + store.getUserPhone(20)),
+              "user20");
     EXPECT_TRUE(store.doesUserExist(L"user20"_w));
     EXPECT_FALSE(store.doesUserExist(L"User1"_w) || store.doesUserExist(L""_w));
     EXPECT_EQ(m_log.messages(kWarning).size(), 5u); // one per refusal
@@ -96,7 +101,8 @@ TEST_F(UsersUpdaterTest, TwentyUsersIsTheLimit)
 // load keeps edits, reload discards them.
 TEST_F(UsersUpdaterTest, RemoveAllUsersReloadAndSecondLoad)
 {
-    UsersUpdater& store = loaded(typed("Set", "users", typed("Set", "user1", str("name", "Old") + str("badge", "B1"))) + typed("Int", "Version", "7"));
+    UsersUpdater& store = loaded(typed("Set", "users", typed("Set", "user1", str("name", "Old") + str("badge", "B1"))) +
+                                 typed("Int", "Version", "7"));
     ASSERT_TRUE(store.removeAllUsers() && store.save() && store.addUser(L"Bruno"_w, L""_w, L""_w));
     EXPECT_TRUE(store.load());
     EXPECT_TRUE(m_log.contains("[bool UsersUpdater::load()]: File already loaded", kWarning));
@@ -106,7 +112,8 @@ TEST_F(UsersUpdaterTest, RemoveAllUsersReloadAndSecondLoad)
     EXPECT_EQ(utf8(store.getUserName(19) + store.getUserAddress(19) + store.getUserPhone(19)), "000");
     // Only the name is required; users with any text survive save and load unchanged.
     EXPECT_FALSE(store.addUser(L""_w, L"addr"_w, L"tel"_w));
-    ASSERT_TRUE(store.addUser(wide("王"), L""_w, L""_w) && store.addUser(wide(kLukasz.name), wide(kLukasz.address), wide(kLukasz.phone)) && store.save());
+    ASSERT_TRUE(store.addUser(wide("王"), L""_w, L""_w) &&
+                store.addUser(wide(kLukasz.name), wide(kLukasz.address), wide(kLukasz.phone)) && store.save());
     EXPECT_EQ(SettingsFiles::usersIn(path()), (std::vector<User>{{"王", "", ""}, kLukasz}));
     const std::string file = TempDir::read(path());
     EXPECT_TRUE(file.find(">B1<") != std::string::npos && file.find("\"Version\">7<") != std::string::npos);

@@ -20,7 +20,8 @@ using Setter = bool (WorkshopInfoUpdater::*)(const ACE_WString&);
 
 // Key, method name without "get" or "set", getter, setter.
 const std::tuple<const char*, const char*, Getter, Setter> kFields[] = {
-    {"numero_affaire", "BusinessNumber", &WorkshopInfoUpdater::getBusinessNumber, &WorkshopInfoUpdater::setBusinessNumber},
+    {"numero_affaire", "BusinessNumber", &WorkshopInfoUpdater::getBusinessNumber,
+     &WorkshopInfoUpdater::setBusinessNumber},
     {"raison_sociale", "CorporateName", &WorkshopInfoUpdater::getCorporateName, &WorkshopInfoUpdater::setCorporateName},
     {"nom", "Name", &WorkshopInfoUpdater::getName, &WorkshopInfoUpdater::setName},
     {"rue", "Road", &WorkshopInfoUpdater::getRoad, &WorkshopInfoUpdater::setRoad},
@@ -46,24 +47,53 @@ TEST(NotLoadedStores, RefuseEveryCallAndKeepTheFile)
     BSet infos(10);
     const auto none = [](const ACE_WString& text) { return text.length() == 0; };
 #define R(expression) [&] { return expression; }
-    std::vector<std::function<bool()>> calls = {
-        R(u.getCheckInternet()), R(!u.setCheckInternet(true)), R(none(u.getDeploymentMode())), R(!u.setDeploymentMode(L"x"_w)),
-        R(none(u.getDistributionFolderPath())), R(!u.setDistributionFolderPath(L"x"_w)), R(none(u.getLocalDistributionFolderPath())),
-        R(!u.setLocalDistributionFolderPath(L"x"_w)), R(none(u.getTaskTime())), R(!u.setTaskTime(L"x"_w)), R(none(u.getUpdateRetrievalTime())),
-        R(none(u.getFeedbackFolderPath())), R(u.getErrorCounter() == 0), R(u.getMaxLogsNumber() == 0), R(!u.getLogDebug()),
-        R(!u.save(wide(path))), R(!s.save()), R(s.getUserCount() == 0), R(none(s.getUserName(25))), R(none(s.getUserAddress(0))),
-        R(none(s.getUserPhone(0))), R(!s.addUser(L""_w, L"a"_w, L"p"_w)), R(!s.removeAllUsers()), R(!s.doesUserExist(L""_w)),
-        R(!s.isActivated()), R(!s.activate(true)), R(!s.setApp2AppParams(L"1"_w, L"2"_w, L"3"_w)), R(none(s.getApp2AppPort())),
-        R(none(s.getApp2AppIP())), R(none(s.getApp2AppDealerID())), R(s.getApp2AppNumRetries() == -1), R(s.getApp2AppTimeout() == -1.0),
-        R(!w.getNewDocuviaMode()), R(!w.setNewDocuviaMode(true)), R(!w.getMarvaneIDPInfos(infos)), R(!w.setMarvaneIDPInfos(infos)),
-        R(!w.save())};
+    std::vector<std::function<bool()>> calls = {R(u.getCheckInternet()),
+                                                R(!u.setCheckInternet(true)),
+                                                R(none(u.getDeploymentMode())),
+                                                R(!u.setDeploymentMode(L"x"_w)),
+                                                R(none(u.getDistributionFolderPath())),
+                                                R(!u.setDistributionFolderPath(L"x"_w)),
+                                                R(none(u.getLocalDistributionFolderPath())),
+                                                R(!u.setLocalDistributionFolderPath(L"x"_w)),
+                                                R(none(u.getTaskTime())),
+                                                R(!u.setTaskTime(L"x"_w)),
+                                                R(none(u.getUpdateRetrievalTime())),
+                                                R(none(u.getFeedbackFolderPath())),
+                                                R(u.getErrorCounter() == 0),
+                                                R(u.getMaxLogsNumber() == 0),
+                                                R(!u.getLogDebug()),
+                                                R(!u.save(wide(path))),
+                                                R(!s.save()),
+                                                R(s.getUserCount() == 0),
+                                                R(none(s.getUserName(25))),
+                                                R(none(s.getUserAddress(0))),
+                                                R(none(s.getUserPhone(0))),
+                                                R(!s.addUser(L""_w, L"a"_w, L"p"_w)),
+                                                R(!s.removeAllUsers()),
+                                                R(!s.doesUserExist(L""_w)),
+                                                R(!s.isActivated()),
+                                                R(!s.activate(true)),
+                                                R(!s.setApp2AppParams(L"1"_w, L"2"_w, L"3"_w)),
+                                                R(none(s.getApp2AppPort())),
+                                                R(none(s.getApp2AppIP())),
+                                                R(none(s.getApp2AppDealerID())),
+                                                R(s.getApp2AppNumRetries() == -1),
+                                                R(s.getApp2AppTimeout() == -1.0),
+                                                R(!w.getNewDocuviaMode()),
+                                                R(!w.setNewDocuviaMode(true)),
+                                                R(!w.getMarvaneIDPInfos(infos)),
+                                                R(!w.setMarvaneIDPInfos(infos)),
+                                                R(!w.save())};
 #undef R
     for (const auto& field : kFields)
-        calls.insert(calls.end(), {[&, get = std::get<2>(field)] { return none((w.*get)()); }, [&, set = std::get<3>(field)] { return !(w.*set)(L"x"_w); }});
+        calls.insert(calls.end(), {[&, get = std::get<2>(field)] { return none((w.*get)()); },
+                                   [&, set = std::get<3>(field)] { return !(w.*set)(L"x"_w); }});
     for (size_t i = 0; i < calls.size(); ++i)
     {
         log.clear();
-        EXPECT_TRUE(calls[i]() && log.messages(kWarning).size() + log.messages(kError).size() == 1 && log.containsSubstring("not loaded")) << i;
+        EXPECT_TRUE(calls[i]() && log.messages(kWarning).size() + log.messages(kError).size() == 1 &&
+                    log.containsSubstring("not loaded"))
+            << i;
     }
     EXPECT_TRUE(s.getMaxUserCount() == 20u && s.getApp2AppReqAttrs().isEmpty()); // no App2App defaults either
     EXPECT_EQ(TempDir::read(path), malformed);
@@ -76,23 +106,27 @@ TEST_F(WorkshopInfoUpdaterTest, MissingFileGivesEmptyLoadedStoreThatSaveCreates)
     std::filesystem::create_directories(path());
     WorkshopInfoUpdater onFolder(wide(path()));
     EXPECT_FALSE(onFolder.load());
-    EXPECT_TRUE(onFolder.isLoaded() && m_log.containsSubstring("does not exist, setting state to empty BSet", kWarning));
+    EXPECT_TRUE(onFolder.isLoaded() &&
+                m_log.containsSubstring("does not exist, setting state to empty BSet", kWarning));
     std::filesystem::remove_all(m_dir.file("Data"));
     WorkshopInfoUpdater store(wide(path()));
     EXPECT_FALSE(store.load());
     EXPECT_TRUE(store.isLoaded());
     BSet infos(10);
     EXPECT_FALSE(store.getNewDocuviaMode() || store.getMarvaneIDPInfos(infos)); // error 1: no such key
-    EXPECT_TRUE(m_log.contains("WorkshopInfoUpdater::getMarvaneIDPInfosm_BSet.get('IDP_Infos') failed with error '1')", kError));
+    EXPECT_TRUE(m_log.contains("WorkshopInfoUpdater::getMarvaneIDPInfosm_BSet.get('IDP_Infos') failed with error '1')",
+                               kError));
     EXPECT_TRUE(store.setName(wide("Garage Żółć")) && store.setNewDocuviaMode(true));
     TempDir::write(m_dir.file("Data"), "not a folder");
     EXPECT_FALSE(store.save());
-    EXPECT_TRUE(m_log.contains("WorkshopInfoUpdater::save: could not create parent folder for file '" + path() + "'", kWarning));
+    EXPECT_TRUE(m_log.contains("WorkshopInfoUpdater::save: could not create parent folder for file '" + path() + "'",
+                               kWarning));
     std::filesystem::remove(m_dir.file("Data"));
     ASSERT_TRUE(store.save());
     bool mode = false;
     const BSet saved = SettingsFiles::read(path());
-    EXPECT_TRUE(SettingsFiles::stringAt(saved, "nom") == "Garage Żółć" && saved.getBool(L"new_docuvia_mode"_w, mode) == 0 && mode && saved.size() == 2);
+    EXPECT_TRUE(SettingsFiles::stringAt(saved, "nom") == "Garage Żółć" &&
+                saved.getBool(L"new_docuvia_mode"_w, mode) == 0 && mode && saved.size() == 2);
 }
 
 // Each text field reads and writes its own key; the identity provider's infos must be a set.
@@ -122,7 +156,8 @@ TEST_F(WorkshopInfoUpdaterTest, FieldsRoundTripAndASecondLoadKeepsEdits)
     EXPECT_TRUE(infos.equals(given));
     const BSet saved = SettingsFiles::read(path());
     for (const auto& [key, name, get, set] : kFields)
-        EXPECT_EQ(SettingsFiles::stringAt(saved, key), std::string(key) == "default_brand" ? key : std::string(name) + " 漢字");
+        EXPECT_EQ(SettingsFiles::stringAt(saved, key),
+                  std::string(key) == "default_brand" ? key : std::string(name) + " 漢字");
 }
 
 // The file keeps a brand's key; the dialog shows and picks its text from the text component.
@@ -154,13 +189,14 @@ TEST_F(WorkshopBrandTest, SetStoresTheKeyOfTheShownNameOrTheFirstKeyAndGetShowsI
     EXPECT_FALSE(loaded("").setDefaultBrand(L"Alpha Motors"_w));
     EXPECT_EQ(storedBrand(), "");
     publishBrands();
-    for (const auto& [shown, matched, stored] : {std::tuple("Beta Automobiles", true, "20"), std::tuple("name 30", true, "30"),
-                                                 std::tuple("name 20", false, "10")})
+    for (const auto& [shown, matched, stored] : {std::tuple("Beta Automobiles", true, "20"),
+                                                 std::tuple("name 30", true, "30"), std::tuple("name 20", false, "10")})
     {
         EXPECT_EQ(loaded("").setDefaultBrand(wide(shown)), matched) << shown;
         EXPECT_EQ(storedBrand(), stored) << shown;
     }
-    for (const auto& [stored, shown] : {std::pair("20", "Beta Automobiles"), std::pair("30", ""), std::pair("99", ""), std::pair("0", ""), std::pair("abc", ""), std::pair("", "")})
+    for (const auto& [stored, shown] : {std::pair("20", "Beta Automobiles"), std::pair("30", ""), std::pair("99", ""),
+                                        std::pair("0", ""), std::pair("abc", ""), std::pair("", "")})
         EXPECT_EQ(utf8(loaded(str("default_brand", stored)).getDefaultBrand()), shown) << stored;
 }
 

@@ -40,18 +40,31 @@ TEST_F(Publication, RecordsShowTheFilesTheConfigurationAndTheIniFile)
     TempDir::write(ini, "[TEST]\nFlag_HF=1\nNetWork=192.168.1.4\n[REPROGRAMMATION]\nNom_Browser1=viewer\n");
     m_text->setText(L"3"_w, wide("Three \xF0\x9D\x84\x9E"));
     const std::pair<const wchar_t*, std::string> configuration[] = {
-        {kIniUri, ini}, {kVersion, "V#3"}, {kFormation, "F1"},
+        {kIniUri, ini},
+        {kVersion, "V#3"},
+        {kFormation, "F1"},
         {L"data:/Configuration/MenuBar/ToolConfigData/DiagnosticURL", "http://diag"}};
     for (const auto& [uri, value] : configuration)
         setConfig(uri, value);
     ToolConfigurationCommand& command = makeCommand();
-    const std::pair<const char*, const char*> expected[] = {
-        {"ProjectNumberEdit", "3|BN-42"}, {"CompanyNameEdit", "3|Garage du Pont"}, {"NameEdit", "3|Garage Ünal"},
-        {"StreetEdit", "3|1 rue Haute"}, {"TownPostCodeEdit", "3|69001|Lyon"}, {"PhoneNumberEdit", "3|0102030405"},
-        {"FaxNumberEdit", "3|0607080910"}, {"DistributionFolderPath", "3|/srv/dist"}, {"App2AppPort", "3|8080"},
-        {"App2AppIP", "3|10.0.0.7"}, {"App2AppDealerID", "3|D77"}, {"BrandCombo", "3|Marque A"},
-        {"SerialNo", "19|Three \xF0\x9D\x84\x9E F1"}, {"HFconnection", "19|1"}, {"IPaddress", "19|192.168.1.4"},
-        {"Navigator1", "19|viewer"}, {"Navigator2", "19|"}, {"DiagURL", "19|http://diag"}};
+    const std::pair<const char*, const char*> expected[] = {{"ProjectNumberEdit", "3|BN-42"},
+                                                            {"CompanyNameEdit", "3|Garage du Pont"},
+                                                            {"NameEdit", "3|Garage Ünal"},
+                                                            {"StreetEdit", "3|1 rue Haute"},
+                                                            {"TownPostCodeEdit", "3|69001|Lyon"},
+                                                            {"PhoneNumberEdit", "3|0102030405"},
+                                                            {"FaxNumberEdit", "3|0607080910"},
+                                                            {"DistributionFolderPath", "3|/srv/dist"},
+                                                            {"App2AppPort", "3|8080"},
+                                                            {"App2AppIP", "3|10.0.0.7"},
+                                                            {"App2AppDealerID", "3|D77"},
+                                                            {"BrandCombo", "3|Marque A"},
+                                                            {"SerialNo", "19|Three \xF0\x9D\x84\x9E F1"},
+                                                            {"HFconnection", "19|1"},
+                                                            {"IPaddress", "19|192.168.1.4"},
+                                                            {"Navigator1", "19|viewer"},
+                                                            {"Navigator2", "19|"},
+                                                            {"DiagURL", "19|http://diag"}};
     for (const auto& [name, shownText] : expected)
         EXPECT_EQ(shown(name), shownText) << name;
     EXPECT_TRUE(flag("CheckInternet"));
@@ -73,7 +86,7 @@ TEST_F(Publication, DisplayOnlyTextsNamingATextAreTranslated)
     // Value (null: absent), text id and text (null: none), record shown.
     const char* const cases[][4] = {{"abc#12", "12", "Frankreich", "19|Frankreich"},
                                     {"abc#13", nullptr, nullptr, "19|abc"},  // no such text: the part before '#'
-                                    {"France", "France", "no", "19|France"},  // no '#': never looked up
+                                    {"France", "France", "no", "19|France"}, // no '#': never looked up
                                     {nullptr, nullptr, nullptr, "19|"}};
     for (const auto& c : cases)
     {
@@ -140,7 +153,8 @@ struct BrokenFileCase
     bool published;
 };
 
-class BrokenFile : public ToolConfigurationTest, public ::testing::WithParamInterface<BrokenFileCase> {};
+class BrokenFile : public ToolConfigurationTest, public ::testing::WithParamInterface<BrokenFileCase>
+{};
 
 TEST_P(BrokenFile, PublicationStopsAtAStoreThatIsNotLoadedAndOkNeverOverwritesAMalformedFile)
 {
@@ -158,19 +172,31 @@ TEST_P(BrokenFile, PublicationStopsAtAStoreThatIsNotLoadedAndOkNeverOverwritesAM
         EXPECT_EQ(has(name), c.published) << name;
     EXPECT_TRUE(has("ActivePreparateur"));
     const bool workshopMissing = c.file == 'w' && !c.malformed;
-    if (workshopMissing) { EXPECT_EQ(shown("NameEdit"), "3|"); }
+    if (workshopMissing)
+    {
+        EXPECT_EQ(shown("NameEdit"), "3|");
+    }
     // The task time reaches the data manager with or without an update store; no time, no text.
     ASSERT_EQ(m_dataManager->createData(ID(Uri::kTaskTime), BString()), 0);
     command.onTaskTimeEditChanged(QTime(7, 5, 0));
     EXPECT_EQ(text(Uri::kTaskTime), "07:05:00");
-    if (c.published) { EXPECT_EQ(utf8(update().getTaskTime()), "07:05:00"); }
+    if (c.published)
+    {
+        EXPECT_EQ(utf8(update().getTaskTime()), "07:05:00");
+    }
     command.onTaskTimeEditChanged(QTime());
     EXPECT_EQ(text(Uri::kTaskTime), "");
 
     command.onNameChanged(QStringLiteral("Neu"));
     command.onOKButtonClicked();
-    if (c.malformed) { EXPECT_EQ(TempDir::read(path), broken); }
-    if (workshopMissing) { EXPECT_EQ(SettingsFiles::stringAt(SettingsFiles::read(path), "nom"), "Neu"); }
+    if (c.malformed)
+    {
+        EXPECT_EQ(TempDir::read(path), broken);
+    }
+    if (workshopMissing)
+    {
+        EXPECT_EQ(SettingsFiles::stringAt(SettingsFiles::read(path), "nom"), "Neu");
+    }
 }
 
 INSTANTIATE_TEST_SUITE_P(Files, BrokenFile,
@@ -204,11 +230,12 @@ struct InitCase
 {
     const char* label;
     const wchar_t* unreachable;
-    const char* message;  // null: init succeeds
-    int reached;          // steps done: registration, message boxes, texts, update agent
+    const char* message; // null: init succeeds
+    int reached;         // steps done: registration, message boxes, texts, update agent
 };
 
-class Init : public ToolConfigurationTest, public ::testing::WithParamInterface<InitCase> {};
+class Init : public ToolConfigurationTest, public ::testing::WithParamInterface<InitCase>
+{};
 
 TEST_P(Init, StopsAtTheFirstMissingPieceAndTheDestructorUnregisters)
 {
@@ -236,15 +263,15 @@ TEST_P(Init, StopsAtTheFirstMissingPieceAndTheDestructorUnregisters)
 
 INSTANTIATE_TEST_SUITE_P(
     Steps, Init,
-    ::testing::Values(
-        InitCase{"AllPresent", nullptr, nullptr, 4},
-        InitCase{"NoWatcher", CQ17FileSystemWatcher::componentID,
-                 "[ToolConfigurationCommand::init()] : Failed to get proxy to Q17FilSystemWatcher.", 0},
-        InitCase{"NoMessageBoxManager", CMessageBoxManager::componentID,
-                 "[ToolConfigurationCommand::init()] Message Box Manager cannot be initialized.", 1},
-        InitCase{"NoText", CBText::componentID, "[ToolConfigurationCommand::init()] BText cannot be initialized.", 2},
-        InitCase{"NoUpdateAgent", CProcStartUpdateAgent::componentID,
-                 "[ToolConfigurationCommand::init()] Cannot get proxy to ProcStartUpdateAgent.", 3}),
+    ::testing::Values(InitCase{"AllPresent", nullptr, nullptr, 4},
+                      InitCase{"NoWatcher", CQ17FileSystemWatcher::componentID,
+                               "[ToolConfigurationCommand::init()] : Failed to get proxy to Q17FilSystemWatcher.", 0},
+                      InitCase{"NoMessageBoxManager", CMessageBoxManager::componentID,
+                               "[ToolConfigurationCommand::init()] Message Box Manager cannot be initialized.", 1},
+                      InitCase{"NoText", CBText::componentID,
+                               "[ToolConfigurationCommand::init()] BText cannot be initialized.", 2},
+                      InitCase{"NoUpdateAgent", CProcStartUpdateAgent::componentID,
+                               "[ToolConfigurationCommand::init()] Cannot get proxy to ProcStartUpdateAgent.", 3}),
     [](const auto& info) { return std::string(info.param.label); });
 
 // File-changed events, named by the path they carry.
@@ -255,14 +282,16 @@ struct EventCase
     bool rebuilt;
 };
 
-class FileEvent : public ToolConfigurationTest, public ::testing::WithParamInterface<EventCase> {};
+class FileEvent : public ToolConfigurationTest, public ::testing::WithParamInterface<EventCase>
+{};
 
 TEST_P(FileEvent, RebuildsForTheSettingsFilesAndListsTheUsersAgainForTheUsersFile)
 {
     const EventCase& c = GetParam();
-    const std::map<std::string, std::string> paths = {
-        {"Workshop", m_workshopPath}, {"Users", m_usersPath}, {"DefaultUpdate", kDefaultUpdatePath},
-        {"Other", m_dir.file("Data/User/Other.xml")}};
+    const std::map<std::string, std::string> paths = {{"Workshop", m_workshopPath},
+                                                      {"Users", m_usersPath},
+                                                      {"DefaultUpdate", kDefaultUpdatePath},
+                                                      {"Other", m_dir.file("Data/User/Other.xml")}};
     // The watcher comes from its library, as in the host.
     destroyComponent(ID(CQ17FileSystemWatcher::componentID));
     ToolConfigurationCommand& command = makeCommand();
@@ -277,7 +306,8 @@ TEST_P(FileEvent, RebuildsForTheSettingsFilesAndListsTheUsersAgainForTheUsersFil
     if (std::string(c.path) == "DefaultUpdate")
         setConfig(Uri::kUpdateFile, "");
 
-    EXPECT_EQ(BEvent<CustomEvent>::post(ToolConfigurationCommand::m_ID, CustomEvent(c.type, wide(paths.at(c.path)))), 1);
+    EXPECT_EQ(BEvent<CustomEvent>::post(ToolConfigurationCommand::m_ID, CustomEvent(c.type, wide(paths.at(c.path)))),
+              1);
     EXPECT_EQ(shown("NameEdit"), c.rebuilt ? "3|Renamed" : "3|Garage Ünal");
     EXPECT_EQ(shown("App2AppPort"), c.rebuilt ? "3|9090" : "3|8080");
     const bool usersFile = std::string(c.path) == "Users" && c.type == 668;
@@ -288,7 +318,9 @@ INSTANTIATE_TEST_SUITE_P(Paths, FileEvent,
                          ::testing::Values(EventCase{"Workshop", 668, true}, EventCase{"Users", 668, true},
                                            EventCase{"DefaultUpdate", 668, true}, EventCase{"Other", 668, false},
                                            EventCase{"Users", 667, false}),
-                         [](const auto& info) { return std::string(info.param.path) + std::to_string(info.param.type); });
+                         [](const auto& info) {
+                             return std::string(info.param.path) + std::to_string(info.param.type);
+                         });
 
 using Command = ToolConfigurationCommand;
 
@@ -307,22 +339,22 @@ TEST_F(UpdateModeTest, ModeOfTheFileAndRadioButtonsSelectTheFolderShown)
     {
         const char* fileMode;
         std::vector<Click> clicks;
-        const char* radios;  // Local, A2A, Other
+        const char* radios; // Local, A2A, Other
         std::string folder;
         const char* mode;
         std::string stored;
-    } cases[] = {
-        {"LOCAL", {}, "100", "2|/var/local/repo", "LOCAL", "/srv/dist"},
-        {"A2A", {}, "010", "2|" + kShare, "A2A", "/srv/dist"},
-        {"OTHER", {}, "001", "3|/srv/dist", "OTHER", "/srv/dist"},
-        // Unknown modes (letter case counts) keep the buttons from before (LOCAL).
-        {"local", {}, "100", "3|/srv/dist", "local", "/srv/dist"},
-        {"OTHER", {local}, "100", "2|/var/local/repo", "LOCAL", "/srv/dist"},
-        {"OTHER", {a2a}, "010", "2|" + kShare, "A2A", kShare},
-        {"OTHER", {a2a, other}, "001", "3|" + kShare, "OTHER", kShare}};
+    } cases[] = {{"LOCAL", {}, "100", "2|/var/local/repo", "LOCAL", "/srv/dist"},
+                 {"A2A", {}, "010", "2|" + kShare, "A2A", "/srv/dist"},
+                 {"OTHER", {}, "001", "3|/srv/dist", "OTHER", "/srv/dist"},
+                 // Unknown modes (letter case counts) keep the buttons from before (LOCAL).
+                 {"local", {}, "100", "3|/srv/dist", "local", "/srv/dist"},
+                 {"OTHER", {local}, "100", "2|/var/local/repo", "LOCAL", "/srv/dist"},
+                 {"OTHER", {a2a}, "010", "2|" + kShare, "A2A", kShare},
+                 {"OTHER", {a2a, other}, "001", "3|" + kShare, "OTHER", kShare}};
     // The radio buttons Local, A2A and Other as "100", "010" or "001".
     const auto radios = [this]() {
-        return std::string() + "01"[flag("LocalRadioButton")] + "01"[flag("A2ARadioButton")] + "01"[flag("OtherRadioButton")];
+        return std::string() + "01"[flag("LocalRadioButton")] + "01"[flag("A2ARadioButton")] +
+               "01"[flag("OtherRadioButton")];
     };
     for (const auto& c : cases)
     {
@@ -448,11 +480,12 @@ TEST_F(CommitTest, RecordingModeFollowsTheBoxAndOkSetsTheLogLevelFromIt)
 
 TEST_F(CommitTest, OkWritesThePublishedUsersInPlaceOfTheOldOnes)
 {
-    SettingsFiles::writeUsers(m_usersPath, {kAnna, kBruno, kClara, {"Dora", "4 Road", "0404"}, {"Emil", "5 Road", "0505"}});
+    SettingsFiles::writeUsers(m_usersPath,
+                              {kAnna, kBruno, kClara, {"Dora", "4 Road", "0404"}, {"Emil", "5 Road", "0505"}});
     ToolConfigurationCommand& command = makeCommand();
-    makeUnreachable(ID(CMediator::componentID));  // OK saves without a mediator
+    makeUnreachable(ID(CMediator::componentID)); // OK saves without a mediator
     BSet published;
-    const User noName{"", "no name", "0000"};  // not written
+    const User noName{"", "no name", "0000"}; // not written
     const User clara{"Clara", "", ""};
     std::vector<User> users{kLukasz, noName, clara};
     for (int n = 3; n < 12; ++n) // keys of two digits too
@@ -564,7 +597,8 @@ struct OwnSaveCase
     char file; // 'w'orkshop, 'u'sers, 'p'reparateur
 };
 
-class OwnSave : public ToolConfigurationTest, public ::testing::WithParamInterface<OwnSaveCase> {};
+class OwnSave : public ToolConfigurationTest, public ::testing::WithParamInterface<OwnSaveCase>
+{};
 
 // The watcher's reports of OK's own save leave the dialog as it is; an outside edit of the same
 // file rebuilds it, and so does a later return to the saved content.
@@ -593,7 +627,10 @@ TEST_P(OwnSave, ReportOfOwnSaveRebuildsNothingWhileAnOutsideEditDoes)
     else
         SettingsFiles::writeUpdate(path, SettingsFiles::Update{true, "OTHER", "/srv/other", "/var/repo", "09:15:00"});
     EXPECT_GT(report(), 0);
-    if (c.file == 'w') { EXPECT_EQ(shown("NameEdit"), "3|Renamed"); }
+    if (c.file == 'w')
+    {
+        EXPECT_EQ(shown("NameEdit"), "3|Renamed");
+    }
     TempDir::write(path, saved);
     EXPECT_GT(report(), 0) << "back to the saved content, but not by the dialog";
     m_dataManager->removeListener(listener);

@@ -83,7 +83,8 @@ TEST_F(UsersTest, AcceptedAddsTakeTheWorkshopPhoneOnlyWhenNoneIsTyped)
         command->onAddClicked();
     }
     EXPECT_EQ(published(), (Users{kAnna, finn, {dora.name, dora.address, "04 50 60"}, eve}));
-    EXPECT_EQ(SettingsFiles::usersIn(m_usersPath), Users{kAnna}) << "the file is written by the tool configuration's OK";
+    EXPECT_EQ(SettingsFiles::usersIn(m_usersPath), Users{kAnna})
+        << "the file is written by the tool configuration's OK";
 }
 
 TEST_F(UsersTest, AddWithTwentyUsersShowsTheNoticeAndNoDialog)
@@ -173,7 +174,7 @@ TEST_F(UsersTest, MissingComponentsOrItemShowNothing)
     LogCapture log;
     orphan.onModifyClicked(itemOf(kAnna).get());
     orphan.onAddClicked();
-    EXPECT_TRUE(log.contains("[UsersCommand::onModifyClicked] : Cannot get proxy to DataManager.",
-                             TesselLog_Static::eWARNING));
+    EXPECT_TRUE(
+        log.contains("[UsersCommand::onModifyClicked] : Cannot get proxy to DataManager.", TesselLog_Static::eWARNING));
     EXPECT_EQ(modals.count, 0);
 }

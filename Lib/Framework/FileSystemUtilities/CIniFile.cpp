@@ -25,7 +25,9 @@ int storeValue(void* user, const char* section, const char* name, const char* va
 }
 }
 
-CIniFile::CIniFile() : m_opened(false) {}
+CIniFile::CIniFile() : m_opened(false)
+{
+}
 
 CIniFile::~CIniFile() = default;
 

@@ -77,8 +77,8 @@ QString absoluteClean(const QString& path)
 
 struct WatchedFile
 {
-    QStringList registered;  // the spellings callers used, each posted back as given
-    FileIdentity identity;   // as last seen
+    QStringList registered; // the spellings callers used, each posted back as given
+    FileIdentity identity;  // as last seen
 };
 
 // Everything about the Qt watcher; touched only on the thread of the application object.
@@ -191,10 +191,9 @@ private:
             const QStringList registered = found->second.registered;
             for (const QString& name : registered)
             {
-                TesselLog_Static::logTrace_static(kComponent, kFile, kClass,
-                                                  (L"[CQ17FileSystemWatcher] file changed: " +
-                                                   name.toStdWString())
-                                                      .c_str());
+                TesselLog_Static::logTrace_static(
+                    kComponent, kFile, kClass,
+                    (L"[CQ17FileSystemWatcher] file changed: " + name.toStdWString()).c_str());
                 BEvent<CustomEvent>::broadcast(CustomEvent(CQ17FileSystemWatcher::eventType, toWide(name)));
             }
         }
@@ -227,7 +226,9 @@ struct CQ17FileSystemWatcher::Impl
     std::shared_ptr<WatchState> state = std::make_shared<WatchState>();
 };
 
-CQ17FileSystemWatcher::CQ17FileSystemWatcher() : CComponent_Thread_NoRef(ID(componentID)), m_impl(new Impl) {}
+CQ17FileSystemWatcher::CQ17FileSystemWatcher() : CComponent_Thread_NoRef(ID(componentID)), m_impl(new Impl)
+{
+}
 
 CQ17FileSystemWatcher::~CQ17FileSystemWatcher()
 {

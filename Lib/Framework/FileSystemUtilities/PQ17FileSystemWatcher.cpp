@@ -3,7 +3,8 @@
 #include "CQ17FileSystemWatcher.h"
 
 PQ17FileSystemWatcher::PQ17FileSystemWatcher(IComponent* component)
-    : ProxyComponent(component), m_pComp(dynamic_cast<CQ17FileSystemWatcher*>(component))
+    : ProxyComponent(component),
+      m_pComp(dynamic_cast<CQ17FileSystemWatcher*>(component))
 {
 }
 

@@ -14,7 +14,9 @@ const char* const kClass = "CMediator";
 
 const wchar_t* const CMediator::componentID = L"gui:GuiToolConfiguration?MedToolConfiguration#ToolConfiguaration.ui";
 
-CMediator::CMediator() : CComponent_Thread_NoRef(ID(componentID)), m_closeCount(0) {}
+CMediator::CMediator() : CComponent_Thread_NoRef(ID(componentID)), m_closeCount(0)
+{
+}
 
 CMediator::~CMediator() = default;
 
@@ -22,8 +24,8 @@ CMediator* CMediator::registerWith(IComponentManager& manager)
 {
     auto component = std::make_unique<CMediator>();
     CMediator* mediator = component.get();
-    const int result = manager.registerComponent(
-        std::move(component), [](IComponent* registered) { return new PMediator(registered); });
+    const int result = manager.registerComponent(std::move(component),
+                                                 [](IComponent* registered) { return new PMediator(registered); });
     return result == 0 ? mediator : nullptr;
 }
 

@@ -14,9 +14,11 @@ Dialog_ConfigurationTest::~Dialog_ConfigurationTest() = default;
 
 bool Dialog_ConfigurationTest::init()
 {
-    setWindowTitle(DialogTexts::text(QStringLiteral("ConfigurationTest/WaitTitle"), QStringLiteral("Configuration test")));
-    m_messageLabel->setText(DialogTexts::text(QStringLiteral("ConfigurationTest/WaitMessage"),
-                                              QStringLiteral("Testing the online-update configuration, please wait...")));
+    setWindowTitle(
+        DialogTexts::text(QStringLiteral("ConfigurationTest/WaitTitle"), QStringLiteral("Configuration test")));
+    m_messageLabel->setText(
+        DialogTexts::text(QStringLiteral("ConfigurationTest/WaitMessage"),
+                          QStringLiteral("Testing the online-update configuration, please wait...")));
     m_cancelButton->setText(DialogTexts::text(QStringLiteral("ConfigurationTest/Cancel"), QStringLiteral("Cancel")));
     return true;
 }

@@ -6,7 +6,9 @@
 #include <QVBoxLayout>
 
 Dialog_ConfigurationTestBase::Dialog_ConfigurationTestBase(QWidget* parent, const char* name, Qt::WindowFlags f)
-    : QDialog(parent, f), m_messageLabel(new QLabel(this)), m_cancelButton(new QPushButton(this))
+    : QDialog(parent, f),
+      m_messageLabel(new QLabel(this)),
+      m_cancelButton(new QPushButton(this))
 {
     if (name != nullptr)
         setObjectName(QString::fromUtf8(name));

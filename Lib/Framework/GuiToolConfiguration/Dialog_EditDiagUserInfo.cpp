@@ -71,7 +71,8 @@ void Dialog_EditDiagUserInfo::accept()
     const QString name = m_nameEdit->text();
     QString refusal;
     if (name.trimmed().isEmpty())
-        refusal = DialogTexts::text(QStringLiteral("EditDiagUserInfo/EmptyName"), QStringLiteral("Please enter a name."));
+        refusal =
+            DialogTexts::text(QStringLiteral("EditDiagUserInfo/EmptyName"), QStringLiteral("Please enter a name."));
     else if (m_forbiddenNames.contains(name, Qt::CaseSensitive))
         refusal = DialogTexts::text(QStringLiteral("EditDiagUserInfo/NameTaken"),
                                     QStringLiteral("A user with this name already exists."));

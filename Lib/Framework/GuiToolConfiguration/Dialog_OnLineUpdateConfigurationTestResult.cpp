@@ -10,29 +10,29 @@
 namespace
 {
 const char* const kPreparerTexts[] = {
-    "The update agent accepts the configuration.",          // 0
-    "The update agent could not start its log.",            // -1
-    "The online-update configuration file is missing.",     // -2
-    "The online-update configuration file is not valid.",   // -3
-    "App2App is not configured.",                           // -4
-    "The distribution folder is not configured.",           // -5
-    "The file copy tool is missing.",                       // -6
-    "The configuration is unknown.",                        // -7
-    "The local update client is not installed.",            // -8
-    "The update server was not found.",                     // -9
-    "The update client is not installed on the server.",    // -10
-    "The distribution folder cannot be accessed.",          // -11
-    "Unknown error with the distribution folder.",          // -12
-    "The update agent is missing.",                         // -13
-    "The update agent did not answer.",                     // -14
+    "The update agent accepts the configuration.",        // 0
+    "The update agent could not start its log.",          // -1
+    "The online-update configuration file is missing.",   // -2
+    "The online-update configuration file is not valid.", // -3
+    "App2App is not configured.",                         // -4
+    "The distribution folder is not configured.",         // -5
+    "The file copy tool is missing.",                     // -6
+    "The configuration is unknown.",                      // -7
+    "The local update client is not installed.",          // -8
+    "The update server was not found.",                   // -9
+    "The update client is not installed on the server.",  // -10
+    "The distribution folder cannot be accessed.",        // -11
+    "Unknown error with the distribution folder.",        // -12
+    "The update agent is missing.",                       // -13
+    "The update agent did not answer.",                   // -14
 };
 
 const char* const kTaskTexts[] = {
-    "The scheduled task is registered as it should be.",         // 1
-    "The scheduled task is not registered.",                     // 2
-    "The scheduled task has wrong settings.",                    // 3
-    "The task scheduler service cannot be reached.",             // 4
-    "Unknown error while checking the scheduled task.",          // 5
+    "The scheduled task is registered as it should be.", // 1
+    "The scheduled task is not registered.",             // 2
+    "The scheduled task has wrong settings.",            // 3
+    "The task scheduler service cannot be reached.",     // 4
+    "Unknown error while checking the scheduled task.",  // 5
 };
 
 bool isPreparerResult(int result)
@@ -98,8 +98,8 @@ bool Dialog_OnLineUpdateConfigurationTestResult::init(int preparerResult, int ta
                                             QStringLiteral("Result of the online-update configuration test:")));
     m_preparerLabel->setText(DialogTexts::text(QStringLiteral("ConfigurationTest/Preparer/%1").arg(preparerResult),
                                                defaultPreparerText(preparerResult)));
-    m_taskLabel->setText(DialogTexts::text(QStringLiteral("ConfigurationTest/Task/%1").arg(taskResult),
-                                           defaultTaskText(taskResult)));
+    m_taskLabel->setText(
+        DialogTexts::text(QStringLiteral("ConfigurationTest/Task/%1").arg(taskResult), defaultTaskText(taskResult)));
     m_okButton->setText(DialogTexts::text(QStringLiteral("ConfigurationTest/OK"), QStringLiteral("OK")));
     return isPreparerResult(preparerResult) && isTaskResult(taskResult);
 }

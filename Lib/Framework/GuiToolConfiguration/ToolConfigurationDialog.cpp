@@ -25,10 +25,10 @@
 #include <QLabel>
 #include <QLineEdit>
 #include <QListWidget>
-#include <QStyle>
 #include <QMetaMethod>
 #include <QPushButton>
 #include <QRadioButton>
+#include <QStyle>
 #include <QThread>
 #include <QTime>
 #include <QTimeEdit>
@@ -159,7 +159,8 @@ void ToolConfigurationDialog::buildWindow()
     groups->setColumnStretch(0, 1);
     groups->setColumnStretch(1, 1);
 
-    auto* recordingMode = new QCheckBox(text(QStringLiteral("RecordingMode"), QStringLiteral("Recording mode (detailed log)")), this);
+    auto* recordingMode =
+        new QCheckBox(text(QStringLiteral("RecordingMode"), QStringLiteral("Recording mode (detailed log)")), this);
     recordingMode->setObjectName(QStringLiteral("ASRMChk"));
     m_bindings.insert(recordingMode->objectName(), {eCHECK_BOX, recordingMode, nullptr});
     connect(recordingMode, &QCheckBox::toggled, this,
@@ -170,8 +171,8 @@ void ToolConfigurationDialog::buildWindow()
     buttons->addWidget(addButton(QStringLiteral("SaveLogsButton"), QStringLiteral("SaveLogs"),
                                  QStringLiteral("Save logs..."), "onButtonSaveLogsClicked()"));
     buttons->addStretch();
-    QPushButton* ok = addButton(QStringLiteral("OKButton"), QStringLiteral("OK"), QStringLiteral("OK"),
-                                "onOKButtonClicked()");
+    QPushButton* ok =
+        addButton(QStringLiteral("OKButton"), QStringLiteral("OK"), QStringLiteral("OK"), "onOKButtonClicked()");
     ok->setDefault(true);
     buttons->addWidget(ok);
     buttons->addWidget(addButton(QStringLiteral("CancelButton"), QStringLiteral("Cancel"), QStringLiteral("Cancel"),
@@ -250,7 +251,8 @@ QGroupBox* ToolConfigurationDialog::buildOnlineUpdateGroup()
     auto* group = new QGroupBox(text(QStringLiteral("OnlineUpdate"), QStringLiteral("Online update")), this);
     auto* form = new QFormLayout(group);
 
-    auto* activated = new QCheckBox(text(QStringLiteral("CheckInternet"), QStringLiteral("Activate online updates")), group);
+    auto* activated =
+        new QCheckBox(text(QStringLiteral("CheckInternet"), QStringLiteral("Activate online updates")), group);
     activated->setObjectName(QStringLiteral("CheckInternet"));
     m_bindings.insert(activated->objectName(), {eCHECK_BOX, activated, nullptr});
     connect(activated, &QCheckBox::toggled, this,
@@ -341,12 +343,12 @@ QGroupBox* ToolConfigurationDialog::buildApp2AppGroup()
     m_usersList->header()->setSectionResizeMode(QHeaderView::ResizeToContents);
     m_usersList->setMinimumHeight(110);
 
-    QPushButton* add = addButton(QStringLiteral("UsersAddButton"), QStringLiteral("UserAdd"), QStringLiteral("Add..."),
-                                 nullptr);
+    QPushButton* add =
+        addButton(QStringLiteral("UsersAddButton"), QStringLiteral("UserAdd"), QStringLiteral("Add..."), nullptr);
     QPushButton* modify = addButton(QStringLiteral("UsersModifyButton"), QStringLiteral("UserModify"),
                                     QStringLiteral("Modify..."), nullptr);
-    QPushButton* remove = addButton(QStringLiteral("UsersDeleteButton"), QStringLiteral("UserDelete"),
-                                    QStringLiteral("Delete"), nullptr);
+    QPushButton* remove =
+        addButton(QStringLiteral("UsersDeleteButton"), QStringLiteral("UserDelete"), QStringLiteral("Delete"), nullptr);
     connect(add, &QPushButton::clicked, this, [this]() { callUsers("onAddClicked()", false); });
     connect(modify, &QPushButton::clicked, this,
             [this]() { callUsers("onModifyClicked(const QListViewItem*)", true); });
@@ -738,11 +740,11 @@ bool ToolConfigurationDialog::invoke(QObject* target, const char* signature, QGe
     const int index = target->metaObject()->indexOfSlot(normalized.constData());
     if (index < 0)
     {
-        TesselLog_Static::logWarning_static(
-            kComponent, kFile, kClass,
-            WideString::fromUtf8("[ToolConfigurationDialog::invoke] : " + std::string(target->metaObject()->className()) +
-                                 " has no slot " + normalized.toStdString())
-                .c_str());
+        TesselLog_Static::logWarning_static(kComponent, kFile, kClass,
+                                            WideString::fromUtf8("[ToolConfigurationDialog::invoke] : " +
+                                                                 std::string(target->metaObject()->className()) +
+                                                                 " has no slot " + normalized.toStdString())
+                                                .c_str());
         return false;
     }
     const QMetaMethod method = target->metaObject()->method(index);

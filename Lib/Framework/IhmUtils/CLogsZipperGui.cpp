@@ -110,7 +110,8 @@ bool CLogsZipperGui::zipFolder(const QString& folder, const QString& zipPath)
     const QString target = QFileInfo(zipPath).absoluteFilePath();
     const QDir root(folderInfo.absoluteFilePath());
     QStringList files;
-    QDirIterator it(root.absolutePath(), QDir::Files | QDir::Hidden | QDir::NoDotAndDotDot, QDirIterator::Subdirectories);
+    QDirIterator it(root.absolutePath(), QDir::Files | QDir::Hidden | QDir::NoDotAndDotDot,
+                    QDirIterator::Subdirectories);
     while (it.hasNext())
     {
         const QString path = QFileInfo(it.next()).absoluteFilePath();
@@ -146,8 +147,7 @@ bool CLogsZipperGui::zipFolder(const QString& folder, const QString& zipPath)
     }
     archive.release();
     TesselLog_Static::logInformation_static(
-        kComponent, kFile, kClass,
-        (L"CLogsZipperGui::zipFolder: logs written to " + target.toStdWString()).c_str());
+        kComponent, kFile, kClass, (L"CLogsZipperGui::zipFolder: logs written to " + target.toStdWString()).c_str());
     return true;
 }
 

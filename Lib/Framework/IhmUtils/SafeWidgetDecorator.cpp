@@ -22,15 +22,13 @@ const char* const kClass = "SafeWidgetDecorator";
 std::map<QString, QString> builtInStyles()
 {
     return {
-        {QStringLiteral("Style84"),
-         QStringLiteral("QDialog { background-color: #f2f2f2; }\n"
-                        "QLabel { font-weight: bold; padding: 8px; }\n"
-                        "QPushButton { min-width: 90px; padding: 4px 12px; }")},
-        {QStringLiteral("Style85"),
-         QStringLiteral("QDialog { background-color: #ffffff; }\n"
-                        "QLabel { padding: 2px; }\n"
-                        "QLineEdit { padding: 2px; border: 1px solid #9a9a9a; }\n"
-                        "QPushButton { min-width: 90px; padding: 4px 12px; }")},
+        {QStringLiteral("Style84"), QStringLiteral("QDialog { background-color: #f2f2f2; }\n"
+                                                   "QLabel { font-weight: bold; padding: 8px; }\n"
+                                                   "QPushButton { min-width: 90px; padding: 4px 12px; }")},
+        {QStringLiteral("Style85"), QStringLiteral("QDialog { background-color: #ffffff; }\n"
+                                                   "QLabel { padding: 2px; }\n"
+                                                   "QLineEdit { padding: 2px; border: 1px solid #9a9a9a; }\n"
+                                                   "QPushButton { min-width: 90px; padding: 4px 12px; }")},
     };
 }
 
@@ -47,7 +45,9 @@ struct SafeWidgetDecorator::Impl
     std::map<QString, QString> styles = builtInStyles();
 };
 
-SafeWidgetDecorator::SafeWidgetDecorator() : m_impl(new Impl) {}
+SafeWidgetDecorator::SafeWidgetDecorator() : m_impl(new Impl)
+{
+}
 
 SafeWidgetDecorator::~SafeWidgetDecorator() = default;
 

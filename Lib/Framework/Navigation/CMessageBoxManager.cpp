@@ -35,7 +35,9 @@ QMessageBox::Icon iconOf(int kind)
 
 const wchar_t* const CMessageBoxManager::componentID = L"tessel:Navigation?MessageBoxManager";
 
-CMessageBoxManager::CMessageBoxManager() : CComponent_Thread_NoRef(ID(componentID)), m_shownCount(0) {}
+CMessageBoxManager::CMessageBoxManager() : CComponent_Thread_NoRef(ID(componentID)), m_shownCount(0)
+{
+}
 
 CMessageBoxManager::~CMessageBoxManager() = default;
 

@@ -3,7 +3,8 @@
 #include "CMessageBoxManager.h"
 
 PMessageBoxManager::PMessageBoxManager(IComponent* component)
-    : ProxyComponent(component), m_pComp(dynamic_cast<CMessageBoxManager*>(component))
+    : ProxyComponent(component),
+      m_pComp(dynamic_cast<CMessageBoxManager*>(component))
 {
 }
 

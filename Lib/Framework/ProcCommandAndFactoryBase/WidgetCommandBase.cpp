@@ -1,7 +1,9 @@
 #include "WidgetCommandBase.h"
 
 WidgetCommandBase::WidgetCommandBase(const QString& commandID)
-    : QObject(nullptr), m_commandID(commandID), m_notificationSkipping(false)
+    : QObject(nullptr),
+      m_commandID(commandID),
+      m_notificationSkipping(false)
 {
 }
 

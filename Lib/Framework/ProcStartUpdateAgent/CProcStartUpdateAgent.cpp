@@ -7,7 +7,8 @@
 const wchar_t* const CProcStartUpdateAgent::componentID = L"proc:ProcStartUpdateAgent?ProcStartUpdateAgent";
 
 CProcStartUpdateAgent::CProcStartUpdateAgent()
-    : CComponent_Thread_NoRef(ID(componentID)), m_runner(std::make_shared<UpdateAgentRunner>())
+    : CComponent_Thread_NoRef(ID(componentID)),
+      m_runner(std::make_shared<UpdateAgentRunner>())
 {
 }
 

@@ -4,7 +4,8 @@
 #include "UpdateAgentRunner.h"
 
 PProcStartUpdateAgent::PProcStartUpdateAgent(IComponent* component)
-    : ProxyComponent(component), m_pComp(dynamic_cast<CProcStartUpdateAgent*>(component))
+    : ProxyComponent(component),
+      m_pComp(dynamic_cast<CProcStartUpdateAgent*>(component))
 {
     if (m_pComp != nullptr)
         m_runner = m_pComp->runner();

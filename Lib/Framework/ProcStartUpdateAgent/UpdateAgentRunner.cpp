@@ -57,7 +57,9 @@ struct SpawnActions
 };
 }
 
-UpdateAgentRunner::UpdateAgentRunner() : m_timeoutMilliseconds(kDefaultTimeoutMilliseconds) {}
+UpdateAgentRunner::UpdateAgentRunner() : m_timeoutMilliseconds(kDefaultTimeoutMilliseconds)
+{
+}
 
 bool UpdateAgentRunner::isOnlineUpdateEnabled() const
 {
@@ -100,9 +102,9 @@ IProcStartUpdateAgent::_enum_CheckConfigurationPreparer UpdateAgentRunner::check
     }
     if (executable.empty())
     {
-        TesselLog_Static::logError_static(kComponent, kFile, kClass, -1,
-                                          "CProcStartUpdateAgent::checkConfigurationPreparer: no update agent configured at %s",
-                                          kAgentExecutable);
+        TesselLog_Static::logError_static(
+            kComponent, kFile, kClass, -1,
+            "CProcStartUpdateAgent::checkConfigurationPreparer: no update agent configured at %s", kAgentExecutable);
         return IProcStartUpdateAgent::eNOK_MISSING_UPDATE_AGENT;
     }
     return static_cast<IProcStartUpdateAgent::_enum_CheckConfigurationPreparer>(
@@ -142,18 +144,19 @@ int UpdateAgentRunner::runAgent(const std::string& executable, const std::string
         posix_spawn_file_actions_addopen(&actions.actions, 1, "/dev/null", O_WRONLY, 0) != 0 ||
         posix_spawn_file_actions_addopen(&actions.actions, 2, "/dev/null", O_WRONLY, 0) != 0)
     {
-        TesselLog_Static::logError_static(kComponent, kFile, kClass, -1,
-                                          "CProcStartUpdateAgent::checkConfigurationPreparer: cannot prepare to start %s",
-                                          executable.c_str());
+        TesselLog_Static::logError_static(
+            kComponent, kFile, kClass, -1,
+            "CProcStartUpdateAgent::checkConfigurationPreparer: cannot prepare to start %s", executable.c_str());
         return IProcStartUpdateAgent::eNOK_MISSING_UPDATE_AGENT;
     }
     pid_t child = 0;
     const int spawned = posix_spawn(&child, executable.c_str(), &actions.actions, nullptr, argv.data(), environ);
     if (spawned != 0)
     {
-        TesselLog_Static::logError_static(kComponent, kFile, kClass, -1,
-                                          "CProcStartUpdateAgent::checkConfigurationPreparer: cannot start %s (error %d)",
-                                          executable.c_str(), spawned);
+        TesselLog_Static::logError_static(
+            kComponent, kFile, kClass, -1,
+            "CProcStartUpdateAgent::checkConfigurationPreparer: cannot start %s (error %d)", executable.c_str(),
+            spawned);
         return IProcStartUpdateAgent::eNOK_MISSING_UPDATE_AGENT;
     }
 

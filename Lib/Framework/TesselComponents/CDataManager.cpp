@@ -234,8 +234,8 @@ CDataManager* CDataManager::registerWith(IComponentManager& manager)
 {
     auto component = std::make_unique<CDataManager>();
     CDataManager* registered = component.get();
-    const int result = manager.registerComponent(std::move(component),
-                                                 [](IComponent* served) { return new PDataManager(served); });
+    const int result =
+        manager.registerComponent(std::move(component), [](IComponent* served) { return new PDataManager(served); });
     return result == 0 ? registered : nullptr;
 }
 

@@ -5,7 +5,8 @@
 #include <utility>
 
 PDataManager::PDataManager(IComponent* component)
-    : ProxyComponent(component), m_pComp(dynamic_cast<CDataManager*>(component))
+    : ProxyComponent(component),
+      m_pComp(dynamic_cast<CDataManager*>(component))
 {
 }
 

@@ -2,7 +2,9 @@
 
 BBool::BBool() = default;
 
-BBool::BBool(bool value) : m_value(value) {}
+BBool::BBool(bool value) : m_value(value)
+{
+}
 
 BData::Type BBool::type() const
 {

@@ -4,7 +4,9 @@
 
 BDouble::BDouble() = default;
 
-BDouble::BDouble(double value) : m_value(value) {}
+BDouble::BDouble(double value) : m_value(value)
+{
+}
 
 BData::Type BDouble::type() const
 {

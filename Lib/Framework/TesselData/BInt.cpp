@@ -2,7 +2,9 @@
 
 BInt::BInt() = default;
 
-BInt::BInt(long value) : m_value(value) {}
+BInt::BInt(long value) : m_value(value)
+{
+}
 
 BData::Type BInt::type() const
 {

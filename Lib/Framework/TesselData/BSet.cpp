@@ -57,9 +57,13 @@ BSet::BSet(int sizeHint)
     m_entries.reserve(static_cast<std::size_t>(std::clamp(sizeHint, 0, 1024)));
 }
 
-BSet::Entry::Entry(const ACE_WString& key, std::unique_ptr<BData> value) : key(key), value(std::move(value)) {}
+BSet::Entry::Entry(const ACE_WString& key, std::unique_ptr<BData> value) : key(key), value(std::move(value))
+{
+}
 
-BSet::Entry::Entry(std::unique_ptr<BData> value) : value(std::move(value)) {}
+BSet::Entry::Entry(std::unique_ptr<BData> value) : value(std::move(value))
+{
+}
 
 BSet::Entry::Entry(Entry&& other) noexcept : value(std::move(other.value))
 {
@@ -91,7 +95,9 @@ BSet& BSet::operator=(const BSet& other)
 }
 
 BSet::BSet(BSet&& other) noexcept
-    : BData(other), m_entries(std::move(other.m_entries)), m_index(std::move(other.m_index))
+    : BData(other),
+      m_entries(std::move(other.m_entries)),
+      m_index(std::move(other.m_index))
 {
     other.m_entries.clear();
     other.m_index.clear();

@@ -2,11 +2,17 @@
 
 BString::BString() = default;
 
-BString::BString(const ACE_WString& value) : m_value(value) {}
+BString::BString(const ACE_WString& value) : m_value(value)
+{
+}
 
-BString::BString(const wchar_t* value, std::size_t length) : m_value(value, length) {}
+BString::BString(const wchar_t* value, std::size_t length) : m_value(value, length)
+{
+}
 
-BString::BString(const wchar_t* value) : m_value(value != nullptr ? ACE_WString(value) : ACE_WString()) {}
+BString::BString(const wchar_t* value) : m_value(value != nullptr ? ACE_WString(value) : ACE_WString())
+{
+}
 
 BData::Type BString::type() const
 {

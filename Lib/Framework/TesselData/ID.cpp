@@ -16,11 +16,17 @@ const ID ID::null;
 
 ID::ID() = default;
 
-ID::ID(const ACE_WString& text) : m_text(text) {}
+ID::ID(const ACE_WString& text) : m_text(text)
+{
+}
 
-ID::ID(const wchar_t* text) : m_text(fromNullable(text)) {}
+ID::ID(const wchar_t* text) : m_text(fromNullable(text))
+{
+}
 
-ID::ID(const char* text) : m_text(WideString::fromUtf8(text)) {}
+ID::ID(const char* text) : m_text(WideString::fromUtf8(text))
+{
+}
 
 const ACE_WString& ID::getString() const
 {

@@ -149,7 +149,8 @@ bool SettingsFile::read(const std::string& path, std::string& bytes, std::string
     FileDescriptor file(::open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK | O_NOCTTY));
     if (file.get() < 0)
         return fail(error, errorNumber, "cannot open");
-    struct stat info{};
+    struct stat info
+    {};
     if (::fstat(file.get(), &info) != 0)
         return fail(error, errorNumber, "cannot stat");
     if (!S_ISREG(info.st_mode))
@@ -190,7 +191,8 @@ bool SettingsFile::writeAtomically(const std::string& path, const std::string& b
     if (file.get() < 0)
         return fail(error, errorNumber, "cannot create temporary file");
     TemporaryFile temporary(temporaryPath);
-    struct stat existing{};
+    struct stat existing
+    {};
     const mode_t mode = ::stat(path.c_str(), &existing) == 0 ? (existing.st_mode & 07777) : 0644;
     if (::fchmod(file.get(), mode) != 0)
         return fail(error, errorNumber, "cannot set permissions");

@@ -9,10 +9,10 @@
 #include <condition_variable>
 #include <cstdio>
 #include <ctime>
+#include <limits>
 #include <memory>
 #include <mutex>
 #include <new>
-#include <limits>
 #include <thread>
 #include <vector>
 
@@ -101,14 +101,12 @@ std::string formatLine(const TesselLog_Static::Record& record)
 {
     const auto now = std::chrono::system_clock::now();
     const std::time_t seconds = std::chrono::system_clock::to_time_t(now);
-    const auto millis =
-        std::chrono::duration_cast<std::chrono::milliseconds>(now.time_since_epoch()).count() % 1000;
+    const auto millis = std::chrono::duration_cast<std::chrono::milliseconds>(now.time_since_epoch()).count() % 1000;
     std::tm local{};
     localtime_r(&seconds, &local);
     char stamp[64];
-    std::snprintf(stamp, sizeof stamp, "%04d-%02d-%02d %02d:%02d:%02d.%03d", local.tm_year + 1900,
-                  local.tm_mon + 1, local.tm_mday, local.tm_hour, local.tm_min, local.tm_sec,
-                  static_cast<int>(millis));
+    std::snprintf(stamp, sizeof stamp, "%04d-%02d-%02d %02d:%02d:%02d.%03d", local.tm_year + 1900, local.tm_mon + 1,
+                  local.tm_mday, local.tm_hour, local.tm_min, local.tm_sec, static_cast<int>(millis));
     const char* name = levelName(record.level);
     std::string line = stamp;
     line += ' ';
@@ -130,8 +128,7 @@ std::string text(const char* value)
     return value != nullptr ? std::string(value) : std::string();
 }
 
-void dispatch(int level, int code, const char* component, const char* file, const char* className,
-              ACE_WString message)
+void dispatch(int level, int code, const char* component, const char* file, const char* className, ACE_WString message)
 {
     TesselLog_Static::Record record{level, code, text(component), text(file), text(className), std::move(message)};
     LoggerState& s = state();
@@ -250,8 +247,8 @@ void TesselLog_Static::logError_static(const char* component, const char* file, 
     dispatch(eERROR, code, component, file, className, std::move(message));
 }
 
-void TesselLog_Static::log_static(int level, int code, const char* component, const char* file,
-                                  const char* className, const wchar_t* format, ...)
+void TesselLog_Static::log_static(int level, int code, const char* component, const char* file, const char* className,
+                                  const wchar_t* format, ...)
 {
     if (!recorded(level))
         return;

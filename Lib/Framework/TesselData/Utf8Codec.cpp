@@ -191,8 +191,9 @@ std::size_t Utf8Codec::firstInvalid(const char* data, std::size_t size)
         }
         const std::size_t used = decodeOne(p, end, c);
         // U+FFFD itself is valid when it is written out in full.
-        if (c == kReplacement && !(used == 3 && static_cast<unsigned char>(p[0]) == 0xEF &&
-                                   static_cast<unsigned char>(p[1]) == 0xBF && static_cast<unsigned char>(p[2]) == 0xBD))
+        if (c == kReplacement &&
+            !(used == 3 && static_cast<unsigned char>(p[0]) == 0xEF && static_cast<unsigned char>(p[1]) == 0xBF &&
+              static_cast<unsigned char>(p[2]) == 0xBD))
             return static_cast<std::size_t>(p - data);
         p += used;
     }

@@ -122,10 +122,10 @@ void trim(const char*& first, const char*& last)
 
 // windows-1252's characters for the bytes 0x80 to 0x9F; the five it leaves undefined keep their
 // C1 control code.
-const char16_t kWindows1252High[32] = {
-    0x20AC, 0x0081, 0x201A, 0x0192, 0x201E, 0x2026, 0x2020, 0x2021, 0x02C6, 0x2030, 0x0160,
-    0x2039, 0x0152, 0x008D, 0x017D, 0x008F, 0x0090, 0x2018, 0x2019, 0x201C, 0x201D, 0x2022,
-    0x2013, 0x2014, 0x02DC, 0x2122, 0x0161, 0x203A, 0x0153, 0x009D, 0x017E, 0x0178};
+const char16_t kWindows1252High[32] = {0x20AC, 0x0081, 0x201A, 0x0192, 0x201E, 0x2026, 0x2020, 0x2021,
+                                       0x02C6, 0x2030, 0x0160, 0x2039, 0x0152, 0x008D, 0x017D, 0x008F,
+                                       0x0090, 0x2018, 0x2019, 0x201C, 0x201D, 0x2022, 0x2013, 0x2014,
+                                       0x02DC, 0x2122, 0x0161, 0x203A, 0x0153, 0x009D, 0x017E, 0x0178};
 
 std::string lowerAscii(std::string text)
 {
@@ -176,7 +176,9 @@ bool toUtf8(const std::string& bytes, std::string& converted, const char*& data,
             std::string& error)
 {
     utf8 = true;
-    const auto byteAt = [&bytes](std::size_t i) { return i < bytes.size() ? static_cast<unsigned char>(bytes[i]) : 0x100; };
+    const auto byteAt = [&bytes](std::size_t i) {
+        return i < bytes.size() ? static_cast<unsigned char>(bytes[i]) : 0x100;
+    };
     std::size_t start = 0;
     if (byteAt(0) == 0xEF && byteAt(1) == 0xBB && byteAt(2) == 0xBF)
         start = 3;
@@ -229,7 +231,8 @@ bool hasDeclaration(const std::string& bytes)
             return false;
         const std::size_t rest = static_cast<std::size_t>(end - mark);
         if (mark > begin && mark[-1] == '<' &&
-            ((rest >= 8 && std::memcmp(mark, "!DOCTYPE", 8) == 0) || (rest >= 7 && std::memcmp(mark, "!ENTITY", 7) == 0)))
+            ((rest >= 8 && std::memcmp(mark, "!DOCTYPE", 8) == 0) ||
+             (rest >= 7 && std::memcmp(mark, "!ENTITY", 7) == 0)))
             return true;
         p = mark + 1;
     }
@@ -535,8 +538,7 @@ bool XmlSetCodec::parse(const std::string& bytes, BSet& out, std::string& error)
     }
     pugi::xml_document document;
     // No end-of-line normalisation: a "\r" written raw inside a value must come back as it was.
-    const unsigned int flags =
-        (pugi::parse_default & ~pugi::parse_eol) | pugi::parse_ws_pcdata | pugi::parse_doctype;
+    const unsigned int flags = (pugi::parse_default & ~pugi::parse_eol) | pugi::parse_ws_pcdata | pugi::parse_doctype;
     std::string converted;
     const char* data = nullptr;
     std::size_t size = 0;
@@ -548,8 +550,7 @@ bool XmlSetCodec::parse(const std::string& bytes, BSet& out, std::string& error)
              : document.load_buffer(bytes.data(), bytes.size(), flags, pugi::encoding_auto);
     if (!result)
     {
-        error = std::string("malformed XML: ") + result.description() + " at offset " +
-                std::to_string(result.offset);
+        error = std::string("malformed XML: ") + result.description() + " at offset " + std::to_string(result.offset);
         return false;
     }
     pugi::xml_node root;

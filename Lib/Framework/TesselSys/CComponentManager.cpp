@@ -125,9 +125,9 @@ int CComponentManager::findOrCreate(const ID& id, std::shared_ptr<Entry>& entry)
         if (creating->second == std::this_thread::get_id())
         {
             lock.unlock();
-            TesselLog_Static::logError_static(kComponent, kFile, kClass, eCOMPONENT_NOT_CREATED,
-                                              "[ComponentManager::getComponent()] '%S' asked for while it is being made",
-                                              id.getString().c_str());
+            TesselLog_Static::logError_static(
+                kComponent, kFile, kClass, eCOMPONENT_NOT_CREATED,
+                "[ComponentManager::getComponent()] '%S' asked for while it is being made", id.getString().c_str());
             return eCOMPONENT_NOT_CREATED;
         }
         m_creationDone.wait(lock);
@@ -154,17 +154,18 @@ int CComponentManager::createFromLibrary(const ID& id, std::shared_ptr<Entry>& e
     const ACE_WString libraryName = id.getLibrary();
     if (libraryName.length() == 0)
     {
-        TesselLog_Static::logError_static(kComponent, kFile, kClass, eUNKNOWN_COMPONENT,
-                                          "[ComponentManager::getComponent()] '%S' is not registered and names no library",
-                                          id.getString().c_str());
+        TesselLog_Static::logError_static(
+            kComponent, kFile, kClass, eUNKNOWN_COMPONENT,
+            "[ComponentManager::getComponent()] '%S' is not registered and names no library", id.getString().c_str());
         return eUNKNOWN_COMPONENT;
     }
     const std::string name = WideString::toUtf8(libraryName);
     if (name.find('/') != std::string::npos)
     {
-        TesselLog_Static::logError_static(kComponent, kFile, kClass, eLIBRARY_NOT_LOADED,
-                                          "[ComponentManager::getComponent()] library name '%s' of '%S' is not a plain name",
-                                          name.c_str(), id.getString().c_str());
+        TesselLog_Static::logError_static(
+            kComponent, kFile, kClass, eLIBRARY_NOT_LOADED,
+            "[ComponentManager::getComponent()] library name '%s' of '%S' is not a plain name", name.c_str(),
+            id.getString().c_str());
         return eLIBRARY_NOT_LOADED;
     }
     std::shared_ptr<Library> library;
@@ -269,7 +270,8 @@ int CComponentManager::getProxy(const ID& id, ProxyComponent*& proxy)
     if (raw == nullptr)
     {
         TesselLog_Static::logError_static(kComponent, kFile, kClass, ePROXY_NOT_CREATED,
-                                          "[ComponentManager::getProxy()] no proxy made for '%S'", id.getString().c_str());
+                                          "[ComponentManager::getProxy()] no proxy made for '%S'",
+                                          id.getString().c_str());
         return ePROXY_NOT_CREATED;
     }
     // A proxy made by a library keeps that library loaded until it is deleted.

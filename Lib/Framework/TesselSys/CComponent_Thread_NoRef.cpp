@@ -22,7 +22,10 @@ int decrementIfPositive(std::atomic<int>& counter)
 }
 
 CComponent_Thread_NoRef::CComponent_Thread_NoRef(const ID& id)
-    : m_componentID(id), m_attachCount(0), m_proxyCount(0), m_referenceCount(0)
+    : m_componentID(id),
+      m_attachCount(0),
+      m_proxyCount(0),
+      m_referenceCount(0)
 {
 }
 

@@ -1,7 +1,8 @@
 #include "ProxyComponent.h"
 
 ProxyComponent::ProxyComponent(IComponent* component)
-    : m_component(component), m_componentID(component != nullptr ? component->getID() : ID::null)
+    : m_component(component),
+      m_componentID(component != nullptr ? component->getID() : ID::null)
 {
 }
 

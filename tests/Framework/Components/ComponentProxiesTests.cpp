@@ -32,9 +32,9 @@ struct ApplicationEnvironment : ::testing::Environment
 // identifier names, through the library's entry points.
 TEST_F(ComponentFixture, EachComponentIsMadeFromItsLibrary)
 {
-    for (const char* id : {"util:FileSystemUtilities?CQ17FileSystemWatcher",
-                           "proc:ProcStartUpdateAgent?ProcStartUpdateAgent", "tessel:Navigation?MessageBoxManager",
-                           "gui:GuiToolConfiguration?MedToolConfiguration#ToolConfiguaration.ui"})
+    for (const char* id :
+         {"util:FileSystemUtilities?CQ17FileSystemWatcher", "proc:ProcStartUpdateAgent?ProcStartUpdateAgent",
+          "tessel:Navigation?MessageBoxManager", "gui:GuiToolConfiguration?MedToolConfiguration#ToolConfiguaration.ui"})
     {
         ProxyComponent* proxy = nullptr;
         ASSERT_EQ(m_manager->getProxy(ID(id), proxy), 0) << id;
@@ -53,7 +53,7 @@ TEST_F(GuiToolConfiguration, MediatorClosesOnlyALiveAttachedDialog)
     CMediator* mediator = CMediator::registerWith(*m_manager);
     SmartProxy<PMediator> proxy;
     ASSERT_TRUE(proxy.acquire(ID(CMediator::componentID)));
-    EXPECT_EQ(proxy->closeDialog(), 1);  // nothing attached yet
+    EXPECT_EQ(proxy->closeDialog(), 1); // nothing attached yet
     QDialog dialog;
     dialog.show();
     mediator->setDialog(&dialog);
@@ -79,12 +79,18 @@ TEST_F(MessageBoxManagerTest, ShowsTheKindAndTheButtonsGivenAndAnswersTheNumberP
         return proxy->showMessageBox(qs("Properties"), qs("Remove the user Łukasz?"), kind, b[0], b[1], b[2]);
     };
     const QString none;
-    const struct { int kind; QMessageBox::Icon icon; QStringList buttons; const char* clicked; int answer; } cases[] = {
-        {1, QMessageBox::Question, {qs("YES"), qs("NO"), none}, "NO", 2},
-        {3, QMessageBox::Warning, {qs("Save"), qs("Discard"), qs("Cancel")}, "Cancel", 3},
-        {4, QMessageBox::Critical, {none, qs("Second"), qs("Third")}, "Third", 3},
-        {0, QMessageBox::NoIcon, {none, none, none}, "OK", 1},
-        {5, QMessageBox::NoIcon, {qs("YES"), none, none}, nullptr, 0}};
+    const struct
+    {
+        int kind;
+        QMessageBox::Icon icon;
+        QStringList buttons;
+        const char* clicked;
+        int answer;
+    } cases[] = {{1, QMessageBox::Question, {qs("YES"), qs("NO"), none}, "NO", 2},
+                 {3, QMessageBox::Warning, {qs("Save"), qs("Discard"), qs("Cancel")}, "Cancel", 3},
+                 {4, QMessageBox::Critical, {none, qs("Second"), qs("Third")}, "Third", 3},
+                 {0, QMessageBox::NoIcon, {none, none, none}, "OK", 1},
+                 {5, QMessageBox::NoIcon, {qs("YES"), none, none}, nullptr, 0}};
     for (const auto& c : cases)
     {
         ModalDriver::whenShown([&](QWidget& modal) {

@@ -47,8 +47,11 @@ TEST_F(FileSystemWatcherTest, FollowsAWatchedFileUnderItsRegisteredSpellingOnly)
     TempDir::write(other, "o");
     ASSERT_EQ(m_proxy->addFile(qs(registered)), CQ17FileSystemWatcher::eOK);
     ASSERT_EQ(m_proxy->run(BOStream(true)), 0);
-    TempDir::write(other, "o3");  // not watched: its event, if any, would come before the watched file's
-    const auto rename = [&] { TempDir::write(real + ".tmp", "1"); std::filesystem::rename(real + ".tmp", real); };
+    TempDir::write(other, "o3"); // not watched: its event, if any, would come before the watched file's
+    const auto rename = [&] {
+        TempDir::write(real + ".tmp", "1");
+        std::filesystem::rename(real + ".tmp", real);
+    };
     const std::function<void()> steps[] = {rename, [&] { TempDir::write(real, "22"); },
                                            [&] { std::filesystem::remove(real); }, [&] { TempDir::write(real, "4"); }};
     for (size_t i = 0; i < std::size(steps); ++i)
@@ -81,9 +84,15 @@ TEST(IniFile, ReadsTheFirstValueOfAKeyInItsSectionOfTheLastOpening)
     ACE_WString value;
     EXPECT_EQ(ini.readAttribute(L"S"_w, L"first"_w, value), CIniFile::eFILE_NOT_OPENED);
     const int ok = CIniFile::eOK, none = CIniFile::eNO_SUCH_ATTRIBUTE, closed = CIniFile::eFILE_NOT_OPENED;
-    const struct { int mode; const char* file; int opened, first, other; } steps[] = {
-        {CIniFile::eREAD, "first.ini", ok, ok, none}, {CIniFile::eREAD, "broken.ini", CIniFile::ePARSE_ERROR, none, ok},
-        {CIniFile::eREAD, "absent.ini", closed, closed, closed}, {2, "first.ini", CIniFile::eBAD_MODE, closed, closed}};
+    const struct
+    {
+        int mode;
+        const char* file;
+        int opened, first, other;
+    } steps[] = {{CIniFile::eREAD, "first.ini", ok, ok, none},
+                 {CIniFile::eREAD, "broken.ini", CIniFile::ePARSE_ERROR, none, ok},
+                 {CIniFile::eREAD, "absent.ini", closed, closed, closed},
+                 {2, "first.ini", CIniFile::eBAD_MODE, closed, closed}};
     for (const auto& s : steps)
     {
         EXPECT_EQ(ini.openIniFile(s.mode, wide(dir.file(s.file))), s.opened) << s.file;

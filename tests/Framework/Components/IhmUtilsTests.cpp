@@ -2,8 +2,8 @@
 #include "ModalDriver.h"
 #include "SafeWidgetDecorator.h"
 #include "TempDir.h"
-#include "TestText.h"
 #include "TesselLog_Static.h"
+#include "TestText.h"
 
 #include <QDir>
 #include <QFileDialog>
@@ -57,7 +57,8 @@ protected:
 
     TempDir m_dir;
     const std::string m_logs = m_dir.file("Logs");
-    const Entries m_logFiles = {{"Tessel.log", "first line\n"}, {"old/deeper/trace.txt", std::string("bin\0data", 8)},
+    const Entries m_logFiles = {{"Tessel.log", "first line\n"},
+                                {"old/deeper/trace.txt", std::string("bin\0data", 8)},
                                 {"Łódź.log", "unicode\n"}};
 };
 
@@ -71,7 +72,7 @@ TEST_F(LogsZipperTest, ArchivesEveryFileUnderItsRelativeNameAndReplacesTheOldArc
     ASSERT_TRUE(zip(m_dir.file("other"), archive));
     ASSERT_TRUE(zip(m_logs, archive));
     EXPECT_EQ(readArchive(archive), m_logFiles);
-    EXPECT_EQ(std::distance(std::filesystem::directory_iterator(m_logs), {}), 4);  // 2 files, "old", the archive
+    EXPECT_EQ(std::distance(std::filesystem::directory_iterator(m_logs), {}), 4); // 2 files, "old", the archive
     EXPECT_FALSE(zip(m_dir.file("empty"), archive));
     EXPECT_FALSE(zip(m_dir.file("absent"), archive));
     EXPECT_EQ(readArchive(archive), m_logFiles);
@@ -118,9 +119,14 @@ TEST(WidgetDecorator, AppliesKnownStylesOfTheStyleFileOnTheGuiThread)
     EXPECT_EQ(decorator->styleSheet(QStringLiteral("Style84")), QStringLiteral("QDialog { color: red; }"));
     EXPECT_TRUE(decorator->styleSheet(QString()).isNull());
     // marks: the widget's style mark, its child's, and its name (a widget without one takes the style's).
-    const struct { const char *style, *name; bool recursive, known; const char* marks; } cases[] = {
-        {"Style99", "", true, true, "Style99|Style99|Style99"}, {"Style85", "kept", false, true, "Style85||kept"},
-        {"Style999", "", true, false, "||"}};
+    const struct
+    {
+        const char *style, *name;
+        bool recursive, known;
+        const char* marks;
+    } cases[] = {{"Style99", "", true, true, "Style99|Style99|Style99"},
+                 {"Style85", "kept", false, true, "Style85||kept"},
+                 {"Style999", "", true, false, "||"}};
     for (const auto& c : cases)
     {
         QWidget widget;
@@ -129,7 +135,8 @@ TEST(WidgetDecorator, AppliesKnownStylesOfTheStyleFileOnTheGuiThread)
         EXPECT_EQ(decorator->decorate(qs(c.style), widget, c.recursive), c.known) << c.style;
         EXPECT_EQ(widget.styleSheet(), decorator->styleSheet(qs(c.style)));
         EXPECT_EQ(widget.property("decoratorStyle").toString() + "|" + child->property("decoratorStyle").toString() +
-                      "|" + widget.objectName(), qs(c.marks));
+                      "|" + widget.objectName(),
+                  qs(c.marks));
     }
     QWidget widget;
     bool decorated = true;

@@ -49,7 +49,7 @@ protected:
 // set, replaces the agent; an agent that hangs is stopped.
 TEST_F(UpdateAgentTest, AnswerIsMinusTheExitStatusOfTheAgent)
 {
-    EXPECT_EQ(check(), Agent::eNOK_MISSING_UPDATE_AGENT);  // none configured
+    EXPECT_EQ(check(), Agent::eNOK_MISSING_UPDATE_AGENT); // none configured
     const std::string record = m_dir.file("arguments.txt");
     configureAgent("printf '%s|' \"$@\" > '" + record + "'");
     for (const auto& [uri, file] : {std::pair<const wchar_t*, std::string>{nullptr, ""},
@@ -61,11 +61,15 @@ TEST_F(UpdateAgentTest, AnswerIsMinusTheExitStatusOfTheAgent)
         ASSERT_EQ(check(), Agent::eOK);
         EXPECT_EQ(TempDir::read(record), "--check-configuration|" + file);
     }
-    const struct { const char* script; bool executable; int answer; } cases[] = {
-        {"exit 40", true, -40},  // beyond the list: passed on as it comes
-        {"echo noise >&2; exit 2", true, Agent::eNOK_MISSING_CONFIGURATION_FILE},
-        {"kill -9 $$", true, Agent::eNOK_DISTRIBUTION_FOLDER_UNKNOWN_ERROR},  // no exit status to read
-        {"exit 0", false, Agent::eNOK_MISSING_UPDATE_AGENT}};
+    const struct
+    {
+        const char* script;
+        bool executable;
+        int answer;
+    } cases[] = {{"exit 40", true, -40}, // beyond the list: passed on as it comes
+                 {"echo noise >&2; exit 2", true, Agent::eNOK_MISSING_CONFIGURATION_FILE},
+                 {"kill -9 $$", true, Agent::eNOK_DISTRIBUTION_FOLDER_UNKNOWN_ERROR}, // no exit status to read
+                 {"exit 0", false, Agent::eNOK_MISSING_UPDATE_AGENT}};
     for (const auto& c : cases)
     {
         configureAgent(c.script, c.executable);
@@ -92,7 +96,7 @@ TEST_F(UpdateAgentTest, CallOnAWorkerOutlivesTheComponent)
     for (int i = 0; i < 2000 && !std::filesystem::exists(started); ++i)
         std::this_thread::sleep_for(std::chrono::milliseconds(5));
     EXPECT_EQ(destroyComponent(ID(CProcStartUpdateAgent::componentID)), 0);
-    TempDir::write(release, "");  // before any check can end the test: the worker waits for it
+    TempDir::write(release, ""); // before any check can end the test: the worker waits for it
     EXPECT_EQ(answer.get(), Agent::eNOK_PATH_NOT_CONFIGURED);
     EXPECT_EQ(proxy->checkConfigurationPreparer(), Agent::eNOK_NO_AGENT);
     EXPECT_FALSE(proxy->isOnlineUpdateEnabled());

@@ -57,7 +57,7 @@ TEST(BSet, KeepsInsertionOrderReplacesInPlaceAndCopiesDeeply)
     BSet moved(std::move(assigned));
     EXPECT_TRUE(moved.equals(original));
     EXPECT_TRUE(assigned.isEmpty()); // NOLINT(bugprone-use-after-move): moved-from sets are empty
-    outer.setSet(L"self"_w, outer); // storing a set in itself stores its old content
+    outer.setSet(L"self"_w, outer);  // storing a set in itself stores its old content
     ASSERT_EQ(outer.getSet(L"self"_w, set), BSet::eOK);
     EXPECT_FALSE(set.contains(L"self"_w));
 }
@@ -105,8 +105,8 @@ TEST(BSet, MovesInAndEditsNestedSetsInPlace)
     inner.setInt(L"again"_w, 1);
     EXPECT_EQ(inner.size(), 1);
 
-    outer.editSet(L"s"_w).setInt(L"x"_w, 1);     // another kind is replaced at its place
-    outer.editSet(L"m"_w).setInt(L"u3"_w, 3);    // an existing set is changed, keeping its other keys
+    outer.editSet(L"s"_w).setInt(L"x"_w, 1);       // another kind is replaced at its place
+    outer.editSet(L"m"_w).setInt(L"u3"_w, 3);      // an existing set is changed, keeping its other keys
     outer.editSet(L"new"_w).setBool(L"y"_w, true); // a missing key is added at the end
     EXPECT_EQ(keysOf(outer), "smnew");
     BSet m;

@@ -29,7 +29,8 @@ TEST(Format, TranslatesEachConversion)
     const std::wstring longText(5000, L'w');
     const auto* noWide = static_cast<const wchar_t*>(nullptr);
     const auto* noNarrow = static_cast<const char*>(nullptr);
-    const std::pair<std::wstring, std::wstring> cases[] = { // actual, expected
+    const std::pair<std::wstring, std::wstring> cases[] = {
+        // actual, expected
         // Wide formats: %s wide, %S narrow (UTF-8).
         {format(L"%s|%S|%ls|%hs|%ws", L"wide", "narrow", L"l", "h", L"w"), L"wide|narrow|l|h|w"},
         {format(L"[%s] [%S]", noWide, noNarrow), L"[(null)] [(null)]"},
@@ -48,30 +49,43 @@ TEST(Format, TranslatesEachConversion)
         {format("Żółć %s %S|%ls|%hs", "Łukasz", L"王小明 😀", L"l", "h"), L"Żółć Łukasz 王小明 😀|l|h"},
         {format("%lX '%i' %lu", 0x80004005UL, 3, 7UL), L"80004005 '3' 7"},
         {format("%S|%s", noWide, noNarrow), L"(null)|(null)"},
-        {format("%s", "a\xff" "b"), L"a\uFFFDb"},
+        {format("%s", "a\xff"
+                      "b"),
+         L"a\uFFFDb"},
     };
     for (const auto& [actual, expected] : cases)
         EXPECT_EQ(actual, expected);
-    EXPECT_EQ(utf8(StringUtilities::wideSprintf(L"%s=%d", L"n", 3)) + utf8(StringUtilities::wideSprintf(nullptr)), "n=3");
+    EXPECT_EQ(utf8(StringUtilities::wideSprintf(L"%s=%d", L"n", 3)) + utf8(StringUtilities::wideSprintf(nullptr)),
+              "n=3");
     for (unsigned int number : {0u, 7u, 10u, 19u, 4294967295u})
-        EXPECT_EQ(StringUtilities::withNumber(L"User#", number), StringUtilities::wideSprintf(L"%s%u", L"User#", number));
+        EXPECT_EQ(StringUtilities::withNumber(L"User#", number),
+                  StringUtilities::wideSprintf(L"%s%u", L"User#", number));
 }
 
 TEST(WideString, ConvertsExactlyAndReplacesInvalidBytes)
 {
-    const struct { std::string utf8; std::wstring wide; } cases[] = {
+    const struct
+    {
+        std::string utf8;
+        std::wstring wide;
+    } cases[] = {
         {"", L""},
         {"Łukasz Żółć", L"\u0141ukasz \u017B\u00F3\u0142\u0107"},
         {"王小明 😀", L"\u738B\u5C0F\u660E \U0001F600"},
-        {"\xC3", L"\uFFFD"},                        // truncated sequence
+        {"\xC3", L"\uFFFD"},                             // truncated sequence
         {"\xC0\xAF\xE0\x80\xAF", L"\uFFFD\uFFFD\uFFFD"}, // overlong, with an invalid or a valid lead
-        {"\xC3\xC3\xA9", L"\uFFFD\u00E9"},         // a lead byte where a continuation belongs
-        {"\xED\xA0\x80", L"\uFFFD"},                // surrogate
-        {"\xF4\x90\x80\x80", L"\uFFFD"},            // above U+10FFFF
-        {"\x80x\xFE", L"\uFFFDx\uFFFD"},            // stray continuation and invalid lead
+        {"\xC3\xC3\xA9", L"\uFFFD\u00E9"},               // a lead byte where a continuation belongs
+        {"\xED\xA0\x80", L"\uFFFD"},                     // surrogate
+        {"\xF4\x90\x80\x80", L"\uFFFD"},                 // above U+10FFFF
+        {"\x80x\xFE", L"\uFFFDx\uFFFD"},                 // stray continuation and invalid lead
         // Runs of eight ASCII bytes and two-byte sequences next to them.
-        {"abcdefgh\xC3\xA9" "12345678", L"abcdefgh\u00E9" "12345678"},
-        {"abcdefgh\xC3" "abcdefgh", L"abcdefgh\uFFFDabcdefgh"},
+        {"abcdefgh\xC3\xA9"
+         "12345678",
+         L"abcdefgh\u00E9"
+         "12345678"},
+        {"abcdefgh\xC3"
+         "abcdefgh",
+         L"abcdefgh\uFFFDabcdefgh"},
         {"abcdefg\xC3", L"abcdefg\uFFFD"},
         {"\xC2\x80\xDF\xBF\xC1\xBF", L"\u0080\u07FF\uFFFD\uFFFD"}, // lowest, highest, overlong
     };

@@ -30,8 +30,8 @@ TEST(Logger, FileGetsAllLinesInRecordingModeAndOnlyProblemsOtherwise)
                                  "ERROR Comp Comp.dll ErrN [-1]: id 王 failed '5'\n"
                                  "ERROR Comp Comp.dll Fail [0]: hr 0x80070005: denied\n";
     const std::string all = "TRACE Comp Comp.dll Trace [0]: [A::b] : started\n"
-                            "INFORMATION Comp Comp.dll Info [0]: 100% done\n" + problems +
-                            "LEVEL3 Comp Comp.dll - [2]: level 3\n";
+                            "INFORMATION Comp Comp.dll Info [0]: 100% done\n" +
+                            problems + "LEVEL3 Comp Comp.dll - [2]: level 3\n";
     TesselLog_Static::setLevel_static(0);
     logOneOfEach();
     TesselLog_Static::setLevel_static(10);
@@ -105,20 +105,26 @@ TEST(Logger, LineIsRecordedOnlyWhenTheFileOrASinkTakesIt)
     };
     const int trace = TesselLog_Static::eTRACE, warning = TesselLog_Static::eWARNING;
     const Case cases[] = {
-        {false, 0, 10, TesselLog_Static::eERROR, false}, {true, 0, 10, trace, true},
-        {true, 0, 0, trace, false},                      {true, 0, 0, TesselLog_Static::eINFORMATION, false},
-        {true, 0, 0, warning, true},                     {true, 0, 0, TesselLog_Static::eERROR, true},
-        {false, trace, 0, trace, true},                  {true, trace, 0, trace, true},
-        {false, warning, 10, trace, false},              {false, warning, 0, warning, true},
+        {false, 0, 10, TesselLog_Static::eERROR, false},
+        {true, 0, 10, trace, true},
+        {true, 0, 0, trace, false},
+        {true, 0, 0, TesselLog_Static::eINFORMATION, false},
+        {true, 0, 0, warning, true},
+        {true, 0, 0, TesselLog_Static::eERROR, true},
+        {false, trace, 0, trace, true},
+        {true, trace, 0, trace, true},
+        {false, warning, 10, trace, false},
+        {false, warning, 0, warning, true},
     };
     for (const Case& c : cases)
     {
         ASSERT_TRUE(TesselLog_Static::setLogFile(c.file ? wide(path) : ACE_WString()));
         TesselLog_Static::setLevel_static(c.verbosity);
         int received = 0;
-        const int sink = c.sinkLevel == 0 ? 0
-                                          : TesselLog_Static::addSink(
-                                                [&received](const TesselLog_Static::Record&) { ++received; }, c.sinkLevel);
+        const int sink =
+            c.sinkLevel == 0
+                ? 0
+                : TesselLog_Static::addSink([&received](const TesselLog_Static::Record&) { ++received; }, c.sinkLevel);
         EXPECT_EQ(TesselLog_Static::isRecorded_static(c.level), c.recorded)
             << c.file << c.sinkLevel << " verbosity " << c.verbosity << " level " << c.level;
         TesselLog_Static::log_static(c.level, 0, "c", "f", "k", L"line");

@@ -41,9 +41,10 @@ TEST(XmlFile, RoundTripKeepsOrderTypesAndEveryValue)
     // The escapes as written: markup and control characters in text, also tabs and line breaks
     // and quotes in keys.
     const std::string written = TempDir::read(path);
-    for (const char* part : {"<String key=\"lines\">one\ntwo\r\nthree\r</String>",
-                             "<String key=\"markup\">&lt;a href=\"x\"&gt;&amp;amp; 'q'&lt;/a&gt; ]]&gt; &#01;&#31;\x7f</String>",
-                             "<String key=\"k\xC3\xA9y &lt;&amp;> &quot;q&quot; &#09;&#10;\"/>", "<Set key=\"empty\"/>"})
+    for (const char* part :
+         {"<String key=\"lines\">one\ntwo\r\nthree\r</String>",
+          "<String key=\"markup\">&lt;a href=\"x\"&gt;&amp;amp; 'q'&lt;/a&gt; ]]&gt; &#01;&#31;\x7f</String>",
+          "<String key=\"k\xC3\xA9y &lt;&amp;> &quot;q&quot; &#09;&#10;\"/>", "<Set key=\"empty\"/>"})
         EXPECT_NE(written.find(part), std::string::npos) << part;
     BSet loaded;
     loaded.setInt(L"stale"_w, 1); // a load replaces the whole content
@@ -60,9 +61,10 @@ TEST(XmlFile, RoundTripKeepsOrderTypesAndEveryValue)
                          "  <Set key=\"inner\"><String key=\"s\"><![CDATA[a<b]]> &#x1F600;</String></Set>\n"
                          "  <String key=\"empty\"/>\n</BSet>\n");
     ASSERT_TRUE(loaded.load(wide(path)) && loaded.save(wide(path), false));
-    EXPECT_EQ(TempDir::read(path), "<?xml version=\"1.0\" encoding=\"UTF-8\"?><BSet><Int key=\"port\">8080</Int>"
-                                   "<Bool key=\"on\">true</Bool><Set key=\"inner\"><String key=\"s\">a&lt;b \xF0\x9F\x98\x80"
-                                   "</String></Set><String key=\"empty\"/></BSet>\n");
+    EXPECT_EQ(TempDir::read(path),
+              "<?xml version=\"1.0\" encoding=\"UTF-8\"?><BSet><Int key=\"port\">8080</Int>"
+              "<Bool key=\"on\">true</Bool><Set key=\"inner\"><String key=\"s\">a&lt;b \xF0\x9F\x98\x80"
+              "</String></Set><String key=\"empty\"/></BSet>\n");
 }
 
 TEST(XmlFile, BadFileIsRefusedAndLeavesTheSetUnchanged)
@@ -100,10 +102,16 @@ TEST(XmlFile, BadFileIsRefusedAndLeavesTheSetUnchanged)
 // The refusal names the first byte that is not UTF-8, after ASCII runs and valid sequences.
 TEST(XmlFile, InvalidUtf8IsRefusedAtItsOffset)
 {
-    const struct { std::string value; int offset; } cases[] = {
+    const struct
+    {
+        std::string value;
+        int offset;
+    } cases[] = {
         {"abcdefghij\xC3(", 32},
         {"\xC3\xA9\xC3\xA9\xE2\x82\xAC\x80", 29},
-        {"\xEF\xBF\xBD" "abcdefgh\xED\xA0\x80", 33}, // U+FFFD written out is valid, a surrogate is not
+        {"\xEF\xBF\xBD"
+         "abcdefgh\xED\xA0\x80",
+         33}, // U+FFFD written out is valid, a surrogate is not
     };
     TempDir dir;
     const std::string path = dir.file("bad.xml");

@@ -47,8 +47,9 @@ protected:
         m_manager->setLibraryPath(kBinFolder);
         m_base = m_manager->getLiveProxyCount();
     }
-    int add(const char* id, IComponentManager::ProxyFactory factory = makeProxy,
-            const std::function<void()>& onDestroy = [] {})
+    int add(
+        const char* id, IComponentManager::ProxyFactory factory = makeProxy,
+        const std::function<void()>& onDestroy = [] {})
     {
         auto hook = [this, onDestroy] {
             onDestroy();
@@ -71,7 +72,9 @@ TEST_F(ComponentManagerTest, RegistrationAndDestroyingAComponentOrphansOnlyItsPr
         reachedFromFactory = SmartProxy<ProxyComponent>().acquire(ID("test:Unit?B"));
         return makeProxy(component);
     };
-    ASSERT_EQ(add("test:Unit?B") + add("test:Unit?A", factory, [] { SmartProxy<ProxyComponent>().acquire(ID("test:Unit?B")); }), 0);
+    ASSERT_EQ(add("test:Unit?B") +
+                  add("test:Unit?A", factory, [] { SmartProxy<ProxyComponent>().acquire(ID("test:Unit?B")); }),
+              0);
     IComponent* registered = m_manager->getComponent(ID("test:Unit?A"));
     LogCapture log;
     EXPECT_EQ(add("test:Unit?A"), IComponentManager::eALREADY_REGISTERED);
@@ -105,7 +108,12 @@ TEST_F(ComponentManagerTest, RegistrationAndDestroyingAComponentOrphansOnlyItsPr
 TEST_F(ComponentManagerTest, ComponentOrProxyThatCannotBeMadeGivesCodeLogLineAndNoProxy)
 {
     ASSERT_EQ(add("test:Unit?NoProxy", [](IComponent*) -> ProxyComponent* { return nullptr; }), 0);
-    const struct { const char* id; int result; const char* logged; } cases[] = {
+    const struct
+    {
+        const char* id;
+        int result;
+        const char* logged;
+    } cases[] = {
         {"test:NoSuchLibraryQx?Any", IComponentManager::eLIBRARY_NOT_LOADED, "libNoSuchLibraryQx.so: cannot open"},
         {"test:../bin/TesselSys?Any", IComponentManager::eLIBRARY_NOT_LOADED, "is not a plain name"},
         {"test:TesselSys?Any", IComponentManager::eENTRY_POINT_MISSING, "lacks the entry point 'createComponent'"},
@@ -127,9 +135,9 @@ TEST_F(ComponentManagerTest, ComponentOrProxyThatCannotBeMadeGivesCodeLogLineAnd
 
     // The base component's state names it, and its counts never go below zero.
     CComponent_Thread_NoRef component(ID("test:Unit?A&B<\"C\">"));
-    const std::vector<int> counts{component.detachProxy(), component.release(),     component.attachProxy(),
-                                  component.attachProxy(), component.detachProxy(), component.acquire(),
-                                  component.attach(),      component.getAttachedProxyCount()};
+    const std::vector<int> counts{
+        component.detachProxy(), component.release(), component.attachProxy(), component.attachProxy(),
+        component.detachProxy(), component.acquire(), component.attach(),      component.getAttachedProxyCount()};
     EXPECT_EQ(counts, (std::vector<int>{-1, -1, 1, 2, 1, 1, 1, 1}));
     // Markup in the identifier is escaped ('>' needs none inside an attribute).
     EXPECT_EQ(utf8(component.getXMLState()), "<component id=\"test:Unit?A&amp;B&lt;&quot;C&quot;>\" attached=\"1\" "
@@ -182,7 +190,8 @@ TEST_F(ComponentManagerTest, LibraryComponentIsMadeOnceAndUnloadedWithTheLastPro
                 first->component()->getID() == ID(kPluginID));
     m_manager->destroyAllComponents();
     EXPECT_TRUE(!m_manager->hasComponent(ID(kPluginID)) && second->component() == nullptr);
-    EXPECT_TRUE(m_manager->releaseProxy(first) == 0 && pluginCounter("testPluginComponentsMade") == 1) << "a live proxy keeps its library";
+    EXPECT_TRUE(m_manager->releaseProxy(first) == 0 && pluginCounter("testPluginComponentsMade") == 1)
+        << "a live proxy keeps its library";
     EXPECT_TRUE(m_manager->releaseProxy(second) == 0 && pluginCounter("testPluginComponentsMade") == -1);
 }
 }

@@ -17,7 +17,10 @@ namespace
 class DataManagerTest : public ComponentFixture
 {
 protected:
-    void publish(const char* uri, const BData& value) { ASSERT_EQ(m_dataManager->createData(ID(uri), value), 0) << uri; }
+    void publish(const char* uri, const BData& value)
+    {
+        ASSERT_EQ(m_dataManager->createData(ID(uri), value), 0) << uri;
+    }
     std::string stringAt(const char* uri, ACE_WString value = L"absent"_w)
     {
         return m_dataManager->getString(ID(uri), value), utf8(value);
@@ -43,13 +46,16 @@ TEST_F(DataManagerTest, FailedAccessGivesItsCodeAndLeavesThePresetOutputAlsoThro
     EXPECT_EQ(m_dataManager->getString(ID("tessel:DM?DataManager"), text), CDataManager::eNOT_A_DATA_URI);
     LogCapture log;
     for (const char* uri : {"tessel:DM?DataManager", "data:/"})
-        EXPECT_EQ(m_dataManager->createData(ID(uri), BString(L"v"_w)) + m_dataManager->setData(ID(uri), BString(L"v"_w)) +
-                      m_dataManager->removeData(ID(uri)), 3 * CDataManager::eNOT_A_DATA_URI) << uri;
+        EXPECT_EQ(m_dataManager->createData(ID(uri), BString(L"v"_w)) +
+                      m_dataManager->setData(ID(uri), BString(L"v"_w)) + m_dataManager->removeData(ID(uri)),
+                  3 * CDataManager::eNOT_A_DATA_URI)
+            << uri;
     EXPECT_TRUE(log.containsSubstring("'tessel:DM?DataManager' is not a data URI", TesselLog_Static::eERROR));
 
     // The proxy forwards until the component is destroyed.
     EXPECT_EQ(dm->createData(ID("data:/Set"), BSet()) + dm->setBool(ID("data:/Flag"), true) +
-                  dm->setString(ID("data:/Path"), L"a"_w) + dm->setData(ID("data:/Path"), BString(L"b"_w)), 0);
+                  dm->setString(ID("data:/Path"), L"a"_w) + dm->setData(ID("data:/Path"), BString(L"b"_w)),
+              0);
     EXPECT_EQ(stringAt("data:/Path"), "b");
     ASSERT_EQ(destroyDataManager(), 0);
     EXPECT_EQ(dm->getString(ID("data:/Path"), text) + dm->getBool(ID("data:/Flag"), flag) +
@@ -75,8 +81,10 @@ TEST_F(DataManagerTest, VisitingASetSeesItsValuesInOrderAndFailsLikeAReadOtherwi
     ASSERT_TRUE(dm.acquire(ID(CDataManager::componentID)));
     const auto visited = [&dm](const char* uri, std::string& seen) {
         return dm->visitValues(ID(uri), [&seen](const ACE_WString& key, const BData& value) {
-            seen += utf8(key) + (value.type() == BData::eSTRING ? "=" + utf8(static_cast<const BString&>(value).value())
-                                                                : std::string("#")) + " ";
+            seen += utf8(key) +
+                    (value.type() == BData::eSTRING ? "=" + utf8(static_cast<const BString&>(value).value())
+                                                    : std::string("#")) +
+                    " ";
         });
     };
     std::string seen;
@@ -86,12 +94,14 @@ TEST_F(DataManagerTest, VisitingASetSeesItsValuesInOrderAndFailsLikeAReadOtherwi
     int entries = -1;
     EXPECT_EQ(dm->visitNestedValues(ID("data:/Brands"), entries,
                                     [&seen](const ACE_WString& setKey, const ACE_WString& key, const BData& value) {
-                                        seen += utf8(setKey) + "/" + utf8(key) + (value.type() == BData::eSTRING ? "$ " : "# ");
+                                        seen += utf8(setKey) + "/" + utf8(key) +
+                                                (value.type() == BData::eSTRING ? "$ " : "# ");
                                     }),
               0);
     EXPECT_EQ(seen, "inner/name$ inner/n# ");
     EXPECT_EQ(entries, 3);
-    EXPECT_EQ(dm->visitNestedValues(ID("data:/Brands/7"), entries, [](auto&, auto&, auto&) {}), CDataManager::eWRONG_TYPE);
+    EXPECT_EQ(dm->visitNestedValues(ID("data:/Brands/7"), entries, [](auto&, auto&, auto&) {}),
+              CDataManager::eWRONG_TYPE);
     EXPECT_EQ(entries, 0);
     seen.clear();
     EXPECT_EQ(visited("data:/Brands/7", seen), CDataManager::eWRONG_TYPE);
@@ -157,7 +167,8 @@ TEST_F(DataManagerTest, WritesAndPreloadReplaceAndInnerNodesReadAsTheSetBelowThe
                  m_dataManager->preload(wide(path), ID("tessel:DM?DataManager")));
     EXPECT_TRUE(log.containsSubstring("missing.xml", TesselLog_Static::eERROR));
     EXPECT_EQ(stringAt("data:/Config/Paths/Workshop") + stringAt("data:/Config/Ports/Workshop") +
-                  stringAt("data:/Config/Paths/Other"), "newnewabsent");
+                  stringAt("data:/Config/Paths/Other"),
+              "newnewabsent");
     bool enabled = false;
     EXPECT_TRUE(m_dataManager->getBool(ID("data:/Config/Enabled"), enabled) == 0 && enabled);
     EXPECT_EQ(heard, (std::vector<std::string>{"data:/Config/Paths/Workshop=2", "data:/Config/Paths/Other=2",
@@ -220,8 +231,9 @@ TEST_F(ComponentFixture, TextsComeFromTheCatalogueOrAreExactlyTheDefault)
     m_text->setText(L"4531"_w, L"Nom"_w);
     EXPECT_FALSE(m_text->loadCatalogue(wide(dir.file("missing.xml"))));
     EXPECT_EQ(utf8(m_text->getText(4531, L""_w)), "Nom") << "an unreadable catalogue keeps the texts there";
-    TempDir::write(dir.file("texts.xml"), "<BSet><String key=\"969\">Ajouter</String><String key=\"BRAND_A\">Marque \u00e9"
-                                          "</String><Int key=\"985\">12</Int></BSet>");
+    TempDir::write(dir.file("texts.xml"),
+                   "<BSet><String key=\"969\">Ajouter</String><String key=\"BRAND_A\">Marque \u00e9"
+                   "</String><Int key=\"985\">12</Int></BSet>");
     LogCapture log;
     ASSERT_TRUE(m_text->loadCatalogue(wide(dir.file("texts.xml"))));
     EXPECT_TRUE(log.containsSubstring("'985'", TesselLog_Static::eERROR)) << "a value that is not a text";

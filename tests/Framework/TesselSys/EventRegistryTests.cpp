@@ -8,8 +8,14 @@
 
 namespace
 {
-struct PingEvent { int value; };
-struct OtherEvent { int value; };
+struct PingEvent
+{
+    int value;
+};
+struct OtherEvent
+{
+    int value;
+};
 
 template <class Event>
 struct CountingHandler : Handler<Event>

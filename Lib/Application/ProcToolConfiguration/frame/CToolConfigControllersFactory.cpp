@@ -14,14 +14,16 @@ const char* const kClass = "CToolConfigControllersFactory";
 
 CToolConfigControllersFactory::CToolConfigControllersFactory(const ID& id) : CComponent_Thread_NoRef(id)
 {
-    TesselLog_Static::logTrace_static(kComponent, kFile, kClass,
-                                      L"[CToolConfigControllersFactory::CToolConfigControllersFactory()] Constructor called");
+    TesselLog_Static::logTrace_static(
+        kComponent, kFile, kClass,
+        L"[CToolConfigControllersFactory::CToolConfigControllersFactory()] Constructor called");
 }
 
 CToolConfigControllersFactory::~CToolConfigControllersFactory()
 {
-    TesselLog_Static::logTrace_static(kComponent, kFile, kClass,
-                                      L"[CToolConfigControllersFactory::~CToolConfigControllersFactory()] Destructor called");
+    TesselLog_Static::logTrace_static(
+        kComponent, kFile, kClass,
+        L"[CToolConfigControllersFactory::~CToolConfigControllersFactory()] Destructor called");
     cleanUp();
 }
 
@@ -43,5 +45,6 @@ WidgetCommandBase* CToolConfigControllersFactory::getControllerByName(const ACE_
 
 void CToolConfigControllersFactory::cleanUp()
 {
-    TesselLog_Static::logTrace_static(kComponent, kFile, kClass, L"[CToolConfigControllersFactory::cleanUp()] method started");
+    TesselLog_Static::logTrace_static(kComponent, kFile, kClass,
+                                      L"[CToolConfigControllersFactory::cleanUp()] method started");
 }

@@ -11,16 +11,19 @@ const char* const kClass = "PProcToolConfigControllersFactory";
 }
 
 PToolConfigControllersFactory::PToolConfigControllersFactory(IComponent* component)
-    : PControllerFactoryBase(component), m_pComp(dynamic_cast<CToolConfigControllersFactory*>(component))
+    : PControllerFactoryBase(component),
+      m_pComp(dynamic_cast<CToolConfigControllersFactory*>(component))
 {
     TesselLog_Static::logTrace_static(
-        kComponent, kFile, kClass, L"[PProcToolConfigControllersFactory::PProcToolConfigControllersFactory()] Constructor called");
+        kComponent, kFile, kClass,
+        L"[PProcToolConfigControllersFactory::PProcToolConfigControllersFactory()] Constructor called");
 }
 
 PToolConfigControllersFactory::~PToolConfigControllersFactory()
 {
     TesselLog_Static::logTrace_static(
-        kComponent, kFile, kClass, L"[PProcToolConfigControllersFactory::~PProcToolConfigControllersFactory()] Destructor called");
+        kComponent, kFile, kClass,
+        L"[PProcToolConfigControllersFactory::~PProcToolConfigControllersFactory()] Destructor called");
 }
 
 void PToolConfigControllersFactory::handleEvent(const EventDestroyingComponent& event)

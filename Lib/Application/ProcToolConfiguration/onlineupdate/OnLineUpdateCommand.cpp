@@ -157,9 +157,10 @@ ScheduledTaskParams getScheduledTaskParamsFromDM()
     ACE_WString taskTime = readString(*dataManager.get(), kTaskTimeUri);
     if (taskTime.is_empty())
     {
-        logWarning(StringUtilities::wideSprintf(
-                       L"getScheduledTaskParamsFromDM: uri '%s' does not exist or empty - will attempt to init", kTaskTimeUri)
-                       .c_str());
+        logWarning(
+            StringUtilities::wideSprintf(
+                L"getScheduledTaskParamsFromDM: uri '%s' does not exist or empty - will attempt to init", kTaskTimeUri)
+                .c_str());
         {
             // Building the dialog's controller publishes its records, the task time among them.
             ToolConfigurationCommand publisher{QString()};
@@ -167,7 +168,8 @@ ScheduledTaskParams getScheduledTaskParamsFromDM()
         }
         if (taskTime.is_empty())
         {
-            logError(L"getScheduledTaskParamsFromDM: unable to find task time in DM - second failure, after init attempt");
+            logError(
+                L"getScheduledTaskParamsFromDM: unable to find task time in DM - second failure, after init attempt");
             return ScheduledTaskParams::s_defaultParams;
         }
     }
@@ -179,9 +181,9 @@ ScheduledTaskParams getScheduledTaskParamsFromDM()
     const ACE_WString minuteText = length > 3 ? taskTime.substring(3, std::min<size_t>(2, length - 3)) : ACE_WString();
     if (length < 5)
     {
-        logError(StringUtilities::wideSprintf(
-                     L"getScheduledTaskParamsFromDM: task time '%s' is shorter than hh:mm (hour '%s', minute '%s') - invalid setting",
-                     taskTime.c_str(), hourText.c_str(), minuteText.c_str())
+        logError(StringUtilities::wideSprintf(L"getScheduledTaskParamsFromDM: task time '%s' is shorter than hh:mm "
+                                              L"(hour '%s', minute '%s') - invalid setting",
+                                              taskTime.c_str(), hourText.c_str(), minuteText.c_str())
                      .c_str());
         return ScheduledTaskParams::s_defaultParams;
     }
@@ -195,7 +197,8 @@ ScheduledTaskParams getScheduledTaskParamsFromDM()
     }
 
     const ACE_WString applicationPath = readString(*dataManager.get(), kExecutablePathUri, kExecutablePathDefault);
-    const ACE_WString parameters = readString(*dataManager.get(), kExecutableParametersUri, kExecutableParametersDefault);
+    const ACE_WString parameters =
+        readString(*dataManager.get(), kExecutableParametersUri, kExecutableParametersDefault);
     const ACE_WString taskName = readString(*dataManager.get(), kTaskNameUri, kTaskNameDefault);
 
     return ScheduledTaskParams(taskName.c_str(), applicationPath.c_str(), parameters.c_str(), hourText.c_str(),
@@ -203,7 +206,8 @@ ScheduledTaskParams getScheduledTaskParamsFromDM()
 }
 
 OnLineUpdateCommand::OnLineUpdateCommand(const QString& commandId)
-    : WidgetCommandBase(commandId), m_waitDialog(nullptr, nullptr, Qt::WindowFlags())
+    : WidgetCommandBase(commandId),
+      m_waitDialog(nullptr, nullptr, Qt::WindowFlags())
 {
     if (!m_bText.acquire(ID(kBTextID)))
     {
@@ -397,7 +401,8 @@ bool OnLineUpdateCommand::startConfigurationTestWindow()
     _enum_CheckConfigurationScheduledTaskResult taskResult = eUNKNOWN_ERROR;
     SmartProxy<PProcStartUpdateAgent> agent;
     if (!agent.acquire(ID(kUpdateAgentID)))
-        logError(L"OnLineUpdateCommand::startConfigurationTestWindow: unable to instanciate proxy to PProcStartUpdateAgent");
+        logError(
+            L"OnLineUpdateCommand::startConfigurationTestWindow: unable to instanciate proxy to PProcStartUpdateAgent");
     else
         taskResult = checkScheduledTask(agent->isOnlineUpdateEnabled());
 
@@ -490,7 +495,8 @@ unsigned long OnLineUpdateCommand::threadMethod_static(void* parameter)
     }
     catch (...)
     {
-        logError(L"OnLineUpdateCommand::threadMethod_static: exception during test. Will attempt to signal future anyway.");
+        logError(
+            L"OnLineUpdateCommand::threadMethod_static: exception during test. Will attempt to signal future anyway.");
     }
 
     try

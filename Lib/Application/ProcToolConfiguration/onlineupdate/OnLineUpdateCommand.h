@@ -71,7 +71,8 @@ private:
 
     // With online updates disabled the task is made for the check if needed and removed
     // afterwards; enabled, it is made if needed and left in place.
-    OnlineUpdateCommand_NS::_enum_CheckConfigurationScheduledTaskResult checkScheduledTask(bool onlineUpdateEnabled) const;
+    OnlineUpdateCommand_NS::_enum_CheckConfigurationScheduledTaskResult checkScheduledTask(
+        bool onlineUpdateEnabled) const;
 
     // The test proper: true when the result dialog was shown.
     bool startConfigurationTestWindow();

@@ -40,7 +40,8 @@ unsigned long hex(HRESULT hr)
 HRESULT createScheduler(ComPtr<ITaskScheduler>& scheduler)
 {
     void* object = nullptr;
-    const HRESULT hr = CoCreateInstance(CLSID_CTaskScheduler, nullptr, CLSCTX_INPROC_SERVER, IID_ITaskScheduler, &object);
+    const HRESULT hr =
+        CoCreateInstance(CLSID_CTaskScheduler, nullptr, CLSCTX_INPROC_SERVER, IID_ITaskScheduler, &object);
     scheduler.reset(static_cast<ITaskScheduler*>(object));
     return hr;
 }
@@ -54,7 +55,9 @@ ACE_WString takeTaskString(LPWSTR text)
 }
 }
 
-CScheduledTaskHelper::CScheduledTaskHelper(ScheduledTaskParams& params) : m_rParams(params) {}
+CScheduledTaskHelper::CScheduledTaskHelper(ScheduledTaskParams& params) : m_rParams(params)
+{
+}
 
 CScheduledTaskHelper::~CScheduledTaskHelper() = default;
 
@@ -63,9 +66,10 @@ bool CScheduledTaskHelper::checkSchedulerServiceRunning()
     SC_HANDLE manager = OpenSCManagerA(nullptr, nullptr, SC_MANAGER_ENUMERATE_SERVICE);
     if (manager == nullptr)
     {
-        logLine(kFailure,
-                L"CScheduledTaskHelper::checkSchedulerServiceRunning: error getting service manager, last error is '%li'",
-                static_cast<long>(GetLastError()));
+        logLine(
+            kFailure,
+            L"CScheduledTaskHelper::checkSchedulerServiceRunning: error getting service manager, last error is '%li'",
+            static_cast<long>(GetLastError()));
         return false;
     }
     const wchar_t* serviceName = L"Schedule";
@@ -83,10 +87,11 @@ bool CScheduledTaskHelper::checkSchedulerServiceRunning()
     bool running = false;
     if (!ControlService(service, SERVICE_CONTROL_INTERROGATE, &status))
     {
-        logLine(kFailure,
-                L"CScheduledTaskHelper::checkSchedulerServiceRunning: fail getting status for service '%s', last error is "
-                L"%li",
-                serviceName, static_cast<long>(GetLastError()));
+        logLine(
+            kFailure,
+            L"CScheduledTaskHelper::checkSchedulerServiceRunning: fail getting status for service '%s', last error is "
+            L"%li",
+            serviceName, static_cast<long>(GetLastError()));
     }
     else if (status.dwCurrentState == SERVICE_RUNNING)
     {
@@ -94,7 +99,8 @@ bool CScheduledTaskHelper::checkSchedulerServiceRunning()
     }
     else
     {
-        logLine(kFailure, L"CScheduledTaskHelper::checkSchedulerServiceRunning: service '%s' is not running", serviceName);
+        logLine(kFailure, L"CScheduledTaskHelper::checkSchedulerServiceRunning: service '%s' is not running",
+                serviceName);
     }
     CloseServiceHandle(service);
     CloseServiceHandle(manager);
@@ -139,23 +145,26 @@ bool getExistingTask(ITaskScheduler* rTaskSchedPtr, const ScheduledTaskParams& r
     case kFileNotFound:
         if (rTaskPtr != nullptr)
         {
-            logLine(kFailure,
-                    L"getExistingTask: rTaskSchedPtr->Activate('%s') return COR_E_FILENOTFOUND but rTaskPtr is not NULL",
-                    taskName.c_str());
+            logLine(
+                kFailure,
+                L"getExistingTask: rTaskSchedPtr->Activate('%s') return COR_E_FILENOTFOUND but rTaskPtr is not NULL",
+                taskName.c_str());
             return false;
         }
         return true;
     case E_ACCESSDENIED:
-        logLine(kTolerated,
-                L"getExistingTask: rTaskSchedPtr->Activate('%s') failed with HRESULT '0x%lX' ('%S') - most likely tasks "
-                L"exists but we don't have privileges to access it",
-                taskName.c_str(), hex(hr), _com_error(hr).ErrorMessage());
+        logLine(
+            kTolerated,
+            L"getExistingTask: rTaskSchedPtr->Activate('%s') failed with HRESULT '0x%lX' ('%S') - most likely tasks "
+            L"exists but we don't have privileges to access it",
+            taskName.c_str(), hex(hr), _com_error(hr).ErrorMessage());
         accessDenied = true;
         return true;
     case E_OUTOFMEMORY:
     case E_INVALIDARG:
     case SCHED_E_UNKNOWN_OBJECT_VERSION:
-        logLine(kFailure, L"getExistingTask: rTaskSchedPtr->Activate('%s') failed with documented HRESULT '0x%lX' ('%S')",
+        logLine(kFailure,
+                L"getExistingTask: rTaskSchedPtr->Activate('%s') failed with documented HRESULT '0x%lX' ('%S')",
                 taskName.c_str(), hex(hr), _com_error(hr).ErrorMessage());
         return false;
     default:
@@ -190,17 +199,19 @@ bool CScheduledTaskHelper::createScheduledTask(bool failIfAlreadyExists)
     HRESULT hr = createScheduler(scheduler);
     if (FAILED(hr))
     {
-        logLine(kFailure,
-                L"CScheduledTaskHelper::createScheduledTask: CoCreateInstance(CLSID_CTaskScheduler) failed with HRESULT "
-                L"'0x%lX' ('%S')",
-                hex(hr), _com_error(hr).ErrorMessage());
+        logLine(
+            kFailure,
+            L"CScheduledTaskHelper::createScheduledTask: CoCreateInstance(CLSID_CTaskScheduler) failed with HRESULT "
+            L"'0x%lX' ('%S')",
+            hex(hr), _com_error(hr).ErrorMessage());
         return false;
     }
     if (!scheduler)
     {
-        logLine(kFailure,
-                L"CScheduledTaskHelper::createScheduledTask: CoCreateInstance(CLSID_CTaskScheduler) OK but smart pointer "
-                L"is NULL");
+        logLine(
+            kFailure,
+            L"CScheduledTaskHelper::createScheduledTask: CoCreateInstance(CLSID_CTaskScheduler) OK but smart pointer "
+            L"is NULL");
         return false;
     }
 
@@ -217,21 +228,24 @@ bool CScheduledTaskHelper::createScheduledTask(bool failIfAlreadyExists)
     {
         if (failIfAlreadyExists)
         {
-            logLine(kFailure,
-                    L"CScheduledTaskHelper::createScheduledTask: task '%s' already exists, and flag to fail in this case "
-                    L"is set",
-                    taskName.c_str());
+            logLine(
+                kFailure,
+                L"CScheduledTaskHelper::createScheduledTask: task '%s' already exists, and flag to fail in this case "
+                L"is set",
+                taskName.c_str());
             return false;
         }
-        logLine(kTolerated,
-                L"CScheduledTaskHelper::createScheduledTask: task '%s' already exists, and flag to fail in this case is "
-                L"not set -> will reuse (possibly updating existing settings)",
-                taskName.c_str());
+        logLine(
+            kTolerated,
+            L"CScheduledTaskHelper::createScheduledTask: task '%s' already exists, and flag to fail in this case is "
+            L"not set -> will reuse (possibly updating existing settings)",
+            taskName.c_str());
         WORD count = 0;
         hr = task->GetTriggerCount(&count);
         if (FAILED(hr))
         {
-            logLine(kFailure, L"CScheduledTaskHelper::createScheduledTask: GetTriggerCount failed with HRESULT '0x%lX' ('%S')",
+            logLine(kFailure,
+                    L"CScheduledTaskHelper::createScheduledTask: GetTriggerCount failed with HRESULT '0x%lX' ('%S')",
                     hex(hr), _com_error(hr).ErrorMessage());
             return false;
         }
@@ -243,16 +257,16 @@ bool CScheduledTaskHelper::createScheduledTask(bool failIfAlreadyExists)
             if (FAILED(hr))
             {
                 logLine(kFailure,
-                        L"CScheduledTaskHelper::createScheduledTask: DeleteTrigger('%hu') failed with HRESULT '0x%lX' ('%S')",
+                        L"CScheduledTaskHelper::createScheduledTask: DeleteTrigger('%hu') failed with HRESULT '0x%lX' "
+                        L"('%S')",
                         static_cast<unsigned int>(index), hex(hr), _com_error(hr).ErrorMessage());
                 return false;
             }
         }
         if (!task)
         {
-            logLine(kFailure,
-                    L"CScheduledTaskHelper::createScheduledTask: ITaskPtr is NULL after 'logic' to manage "
-                    L"failIfAlreadyExists flag (it's time to remove this flag and fix client 'design')");
+            logLine(kFailure, L"CScheduledTaskHelper::createScheduledTask: ITaskPtr is NULL after 'logic' to manage "
+                              L"failIfAlreadyExists flag (it's time to remove this flag and fix client 'design')");
             return false;
         }
     }
@@ -278,9 +292,10 @@ bool CScheduledTaskHelper::createScheduledTask(bool failIfAlreadyExists)
     hr = task->SetApplicationName(m_rParams.applicationPath().c_str());
     if (FAILED(hr))
     {
-        logLine(kFailure,
-                L"CScheduledTaskHelper::createScheduledTask: SetApplicationName('%s') failed with HRESULT '0x%lX' ('%S')",
-                m_rParams.applicationPath().c_str(), hex(hr), _com_error(hr).ErrorMessage());
+        logLine(
+            kFailure,
+            L"CScheduledTaskHelper::createScheduledTask: SetApplicationName('%s') failed with HRESULT '0x%lX' ('%S')",
+            m_rParams.applicationPath().c_str(), hex(hr), _com_error(hr).ErrorMessage());
         return false;
     }
     hr = task->SetParameters(m_rParams.parameters().c_str());
@@ -302,7 +317,8 @@ bool CScheduledTaskHelper::createScheduledTask(bool failIfAlreadyExists)
     hr = task->SetAccountInformation(userName, nullptr);
     if (FAILED(hr))
     {
-        logLine(kFailure, L"CScheduledTaskHelper::createScheduledTask: SetAccountInformation('%s') failed with HRESULT '0x%lX'",
+        logLine(kFailure,
+                L"CScheduledTaskHelper::createScheduledTask: SetAccountInformation('%s') failed with HRESULT '0x%lX'",
                 userName, hex(hr));
         return false;
     }
@@ -321,7 +337,8 @@ bool CScheduledTaskHelper::createScheduledTask(bool failIfAlreadyExists)
         hr = task->CreateTrigger(&newIndex, &trigger.ref());
         if (FAILED(hr))
         {
-            logLine(kFailure, L"CScheduledTaskHelper::createScheduledTask: createTrigger failed with HRESULT '0x%lX' ('%S')",
+            logLine(kFailure,
+                    L"CScheduledTaskHelper::createScheduledTask: createTrigger failed with HRESULT '0x%lX' ('%S')",
                     hex(hr), _com_error(hr).ErrorMessage());
             return false;
         }
@@ -345,7 +362,8 @@ bool CScheduledTaskHelper::createScheduledTask(bool failIfAlreadyExists)
         hr = trigger->SetTrigger(&record);
         if (FAILED(hr))
         {
-            logLine(kFailure, L"CScheduledTaskHelper::createScheduledTask: SetTrigger failed with HRESULT '0x%lX' ('%S')",
+            logLine(kFailure,
+                    L"CScheduledTaskHelper::createScheduledTask: SetTrigger failed with HRESULT '0x%lX' ('%S')",
                     hex(hr), _com_error(hr).ErrorMessage());
             return false;
         }
@@ -356,10 +374,11 @@ bool CScheduledTaskHelper::createScheduledTask(bool failIfAlreadyExists)
     ComPtr<IPersistFile> persistFile(static_cast<IPersistFile*>(persistObject));
     if (FAILED(hr))
     {
-        logLine(kFailure,
-                L"CScheduledTaskHelper::createScheduledTask: QueryInterface(IID_IPersistFile) failed with HRESULT '0x%lX' "
-                L"('%S')",
-                hex(hr), _com_error(hr).ErrorMessage());
+        logLine(
+            kFailure,
+            L"CScheduledTaskHelper::createScheduledTask: QueryInterface(IID_IPersistFile) failed with HRESULT '0x%lX' "
+            L"('%S')",
+            hex(hr), _com_error(hr).ErrorMessage());
         return false;
     }
     if (!persistFile)
@@ -373,7 +392,8 @@ bool CScheduledTaskHelper::createScheduledTask(bool failIfAlreadyExists)
     hr = persistFile->Save(nullptr, TRUE);
     if (FAILED(hr))
     {
-        logLine(kFailure, L"CScheduledTaskHelper::createScheduledTask: persistFilePtr->Save failed with HRESULT '0x%lX' ('%S')",
+        logLine(kFailure,
+                L"CScheduledTaskHelper::createScheduledTask: persistFilePtr->Save failed with HRESULT '0x%lX' ('%S')",
                 hex(hr), _com_error(hr).ErrorMessage());
         return false;
     }
@@ -392,10 +412,11 @@ bool CScheduledTaskHelper::deleteScheduledTask(bool failIfNotExists)
     HRESULT hr = createScheduler(scheduler);
     if (FAILED(hr))
     {
-        logLine(kFailure,
-                L"CScheduledTaskHelper::deleteScheduledTask: CoCreateInstance(CLSID_CTaskScheduler) failed with HRESULT "
-                L"'0x%lX' ('%S')",
-                hex(hr), _com_error(hr).ErrorMessage());
+        logLine(
+            kFailure,
+            L"CScheduledTaskHelper::deleteScheduledTask: CoCreateInstance(CLSID_CTaskScheduler) failed with HRESULT "
+            L"'0x%lX' ('%S')",
+            hex(hr), _com_error(hr).ErrorMessage());
         return false;
     }
     if (!scheduler)
@@ -412,10 +433,11 @@ bool CScheduledTaskHelper::deleteScheduledTask(bool failIfNotExists)
         return true;
     if (!failIfNotExists)
     {
-        logLine(kTolerated,
-                L"CScheduledTaskHelper::deleteScheduledTask: ITSPtr->Delete('%s') failed with HRESULT '0x%lX' ('%S'), but "
-                L"failIfNotExists is not set",
-                taskName.c_str(), hex(hr), _com_error(hr).ErrorMessage());
+        logLine(
+            kTolerated,
+            L"CScheduledTaskHelper::deleteScheduledTask: ITSPtr->Delete('%s') failed with HRESULT '0x%lX' ('%S'), but "
+            L"failIfNotExists is not set",
+            taskName.c_str(), hex(hr), _com_error(hr).ErrorMessage());
         return true;
     }
     logLine(kFailure,
@@ -437,10 +459,11 @@ bool CScheduledTaskHelper::checkTaskAvailableForCurrentUser(bool& taskExists, bo
     const HRESULT hr = createScheduler(scheduler);
     if (FAILED(hr))
     {
-        logLine(kFailure,
-                L"CScheduledTaskHelper::checkTaskAvailableForCurrentUser: CoCreateInstance(CLSID_CTaskScheduler) failed "
-                L"with HRESULT '0x%lX' ('%S')",
-                hex(hr), _com_error(hr).ErrorMessage());
+        logLine(
+            kFailure,
+            L"CScheduledTaskHelper::checkTaskAvailableForCurrentUser: CoCreateInstance(CLSID_CTaskScheduler) failed "
+            L"with HRESULT '0x%lX' ('%S')",
+            hex(hr), _com_error(hr).ErrorMessage());
         return false;
     }
     if (!scheduler)
@@ -477,9 +500,10 @@ _enum_CheckConfigurationScheduledTaskResult CScheduledTaskHelper::checkScheduled
     }
     if (!scheduler)
     {
-        logLine(kFailure,
-                L"CScheduledTaskHelper::checkScheduledTask: CoCreateInstance(CLSID_CTaskScheduler) OK but smart pointer "
-                L"is NULL");
+        logLine(
+            kFailure,
+            L"CScheduledTaskHelper::checkScheduledTask: CoCreateInstance(CLSID_CTaskScheduler) OK but smart pointer "
+            L"is NULL");
         return eCAN_NOT_ACCESS_SERVICE;
     }
 
@@ -502,10 +526,11 @@ _enum_CheckConfigurationScheduledTaskResult CScheduledTaskHelper::checkScheduled
                     taskName.c_str());
             return eCAN_NOT_ACCESS_SERVICE;
         }
-        logLine(kFailure,
-                L"CScheduledTaskHelper::checkScheduledTask: task('%s') does not exist, and flag to fail if task not found "
-                L"is true",
-                taskName.c_str());
+        logLine(
+            kFailure,
+            L"CScheduledTaskHelper::checkScheduledTask: task('%s') does not exist, and flag to fail if task not found "
+            L"is true",
+            taskName.c_str());
         return eTASK_NOT_REGISTERED;
     }
 
@@ -527,8 +552,8 @@ _enum_CheckConfigurationScheduledTaskResult CScheduledTaskHelper::checkScheduled
     hr = task->GetFlags(&flags);
     if (FAILED(hr))
     {
-        logLine(kFailure, L"CScheduledTaskHelper::checkScheduledTask: GetFlags failed with HRESULT '0x%lX' ('%S')", hex(hr),
-                _com_error(hr).ErrorMessage());
+        logLine(kFailure, L"CScheduledTaskHelper::checkScheduledTask: GetFlags failed with HRESULT '0x%lX' ('%S')",
+                hex(hr), _com_error(hr).ErrorMessage());
         return eUNKNOWN_ERROR;
     }
     if ((flags & TASK_FLAG_RUN_ONLY_IF_LOGGED_ON) == 0)
@@ -550,13 +575,15 @@ _enum_CheckConfigurationScheduledTaskResult CScheduledTaskHelper::checkScheduled
     }
     if (text == nullptr)
     {
-        logLine(kFailure, L"CScheduledTaskHelper::checkScheduledTask: GetParameters succeeded but returned NULL string");
+        logLine(kFailure,
+                L"CScheduledTaskHelper::checkScheduledTask: GetParameters succeeded but returned NULL string");
         return eUNKNOWN_ERROR;
     }
     const ACE_WString parameters = takeTaskString(text);
     if (parameters != m_rParams.parameters())
     {
-        logLine(kTolerated, L"CScheduledTaskHelper::checkScheduledTask: invalid startup parameters '%s' - '%s' expected",
+        logLine(kTolerated,
+                L"CScheduledTaskHelper::checkScheduledTask: invalid startup parameters '%s' - '%s' expected",
                 parameters.c_str(), m_rParams.parameters().c_str());
         return eWRONG_SETTINGS;
     }
@@ -565,7 +592,8 @@ _enum_CheckConfigurationScheduledTaskResult CScheduledTaskHelper::checkScheduled
     hr = task->GetApplicationName(&text);
     if (FAILED(hr))
     {
-        logLine(kFailure, L"CScheduledTaskHelper::checkScheduledTask: GetApplicationName failed with HRESULT '0x%lX' ('%S')",
+        logLine(kFailure,
+                L"CScheduledTaskHelper::checkScheduledTask: GetApplicationName failed with HRESULT '0x%lX' ('%S')",
                 hex(hr), _com_error(hr).ErrorMessage());
         return eUNKNOWN_ERROR;
     }
@@ -592,7 +620,8 @@ _enum_CheckConfigurationScheduledTaskResult CScheduledTaskHelper::checkScheduled
     hr = task->GetTrigger(0, &trigger.ref());
     if (FAILED(hr))
     {
-        logLine(kFailure, L"CScheduledTaskHelper::checkScheduledTask: task->GetTrigger failed with HRESULT '0x%lX' ('%S')",
+        logLine(kFailure,
+                L"CScheduledTaskHelper::checkScheduledTask: task->GetTrigger failed with HRESULT '0x%lX' ('%S')",
                 hex(hr), _com_error(hr).ErrorMessage());
         return eUNKNOWN_ERROR;
     }

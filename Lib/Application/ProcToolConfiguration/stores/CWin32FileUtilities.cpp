@@ -20,12 +20,13 @@ ACE_WString CWin32FileUtilities::getParentFolderName(const wchar_t* path)
     wchar_t dir[kBufferSize];
     wchar_t fname[kBufferSize];
     wchar_t ext[kBufferSize];
-    const errno_t error = _wsplitpath_s(path, drive, kBufferSize, dir, kBufferSize, fname, kBufferSize, ext, kBufferSize);
+    const errno_t error =
+        _wsplitpath_s(path, drive, kBufferSize, dir, kBufferSize, fname, kBufferSize, ext, kBufferSize);
     if (error != 0)
     {
-        TesselLog_Static::logError_static("win32Utilities", "", "", -1,
-                                          L"CWin32FileUtilities::getParentFolderName: _wsplitpath_s failed with error '%i' ",
-                                          error);
+        TesselLog_Static::logError_static(
+            "win32Utilities", "", "", -1,
+            L"CWin32FileUtilities::getParentFolderName: _wsplitpath_s failed with error '%i' ", error);
         return ACE_WString();
     }
     wchar_t joined[kBufferSize];

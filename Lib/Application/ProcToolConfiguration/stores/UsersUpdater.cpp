@@ -8,7 +8,6 @@
 #include <cwchar>
 #include <iterator>
 
-
 namespace
 {
 const char* const kComponent = "ProcToolConfiguration";
@@ -135,7 +134,8 @@ unsigned int countUsedSlots(const BSet& content, unsigned int from)
         wchar_t text[16];
         const BSet* slot = nestedSet(*users, slotKey(count + 1, text));
         const BData* name = slot != nullptr ? slot->find(nameKey) : nullptr;
-        if (name == nullptr || name->type() != BData::eSTRING || !isUsedName(static_cast<const BString*>(name)->value()))
+        if (name == nullptr || name->type() != BData::eSTRING ||
+            !isUsedName(static_cast<const BString*>(name)->value()))
             break;
         ++count;
     }

@@ -10,7 +10,6 @@
 #include "TesselLog_Static.h"
 #include "Win32File.h"
 
-
 namespace
 {
 const char* const kComponent = "ProcToolConfiguration";
@@ -42,19 +41,15 @@ void warn(const ACE_WString& message)
 class BrandLookup
 {
 public:
-    BrandLookup()
-    {
-        m_available = m_text.acquire(ID(kTextComponentID)) && m_dataManager.acquire(ID(kDataManagerID));
-    }
+    BrandLookup() { m_available = m_text.acquire(ID(kTextComponentID)) && m_dataManager.acquire(ID(kDataManagerID)); }
 
     bool isAvailable() const { return m_available; }
 
     bool contains(const ACE_WString& key)
     {
         bool found = false;
-        m_dataManager->visitValues(ID(kBrandsURI), [&](const ACE_WString& brand, const BData&) {
-            found = found || brand == key;
-        });
+        m_dataManager->visitValues(ID(kBrandsURI),
+                                   [&](const ACE_WString& brand, const BData&) { found = found || brand == key; });
         return found;
     }
 
@@ -91,8 +86,9 @@ private:
 
 WorkshopInfoUpdater::WorkshopInfoUpdater(const ACE_WString& path) : m_path(path), m_content(10), m_loaded(false)
 {
-    TesselLog_Static::logTrace_static(kComponent, kFile, kClass,
-                                      L"[WorkshopInfoUpdater::WorkshopInfoUpdater(const ACE_WString&)]: Constructor started.");
+    TesselLog_Static::logTrace_static(
+        kComponent, kFile, kClass,
+        L"[WorkshopInfoUpdater::WorkshopInfoUpdater(const ACE_WString&)]: Constructor started.");
 }
 
 WorkshopInfoUpdater::WorkshopInfoUpdater(const WorkshopInfoUpdater& other) = default;
@@ -155,8 +151,8 @@ bool WorkshopInfoUpdater::save(std::string& written)
     }
     if (!CWin32FileUtilities::createParentFolder(m_path.c_str()))
     {
-        warn(StringUtilities::wideSprintf(
-            L"WorkshopInfoUpdater::save: could not create parent folder for file '%s'", m_path.c_str()));
+        warn(StringUtilities::wideSprintf(L"WorkshopInfoUpdater::save: could not create parent folder for file '%s'",
+                                          m_path.c_str()));
         return false;
     }
     return m_content.save(m_path, false, written);
@@ -298,9 +294,9 @@ bool WorkshopInfoUpdater::getMarvaneIDPInfos(BSet& infos) const
     const int error = m_content.getSet(kIDPInfos, infos);
     if (error == 0)
         return true;
-    TesselLog_Static::logError_static(kComponent, kFile, kClass, -1,
-                                      L"WorkshopInfoUpdater::getMarvaneIDPInfosm_BSet.get('%s') failed with error '%i')",
-                                      kIDPInfos, error);
+    TesselLog_Static::logError_static(
+        kComponent, kFile, kClass, -1,
+        L"WorkshopInfoUpdater::getMarvaneIDPInfosm_BSet.get('%s') failed with error '%i')", kIDPInfos, error);
     return false;
 }
 

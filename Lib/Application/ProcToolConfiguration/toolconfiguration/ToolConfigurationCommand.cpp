@@ -8,13 +8,12 @@
 #include "CIniFile.h"
 #include "CLogsZipperGui.h"
 #include "OnLineUpdateCommand.h"
+#include "PMediator.h"
 #include "StringSet.h"
 #include "StringUtilities.h"
 #include "TesselLog_Static.h"
 #include "UpdateUpdater.h"
 #include "UsersCommand.h"
-#include "OnLineUpdateCommand.h"
-#include "PMediator.h"
 #include "UsersUpdater.h"
 #include "WideString.h"
 #include "WorkshopInfoUpdater.h"
@@ -367,7 +366,9 @@ void ToolConfigurationCommand::createDMData(bool reset)
     createDataForControl(L"FaxNumberEdit");
     createDataForCombo(L"BrandCombo");
     createStaticConfigData(ACE_WString(L"data:/Configuration/DoC/SoftInformation/InstallLanguage"), L"Language");
-    createStaticConfigData(ACE_WString(L"data:/Configuration/DoC/SoftInformation/Version"), ACE_WString(L"data:/Configuration/DoC/SoftInformation/VersionFormation"), ACE_WString(L" "), L"SerialNo");
+    createStaticConfigData(ACE_WString(L"data:/Configuration/DoC/SoftInformation/Version"),
+                           ACE_WString(L"data:/Configuration/DoC/SoftInformation/VersionFormation"), ACE_WString(L" "),
+                           L"SerialNo");
     createDataForCheckBox(L"ASRMChk", reset);
     createMarvaneNetData();
     createDataForUUControl(L"App2AppPort");
@@ -612,14 +613,16 @@ void ToolConfigurationCommand::createDataForCombo(const ACE_WString& name)
             const ACE_WString& text = static_cast<const BString&>(value).value();
             values.append(text.c_str(), text.length());
         }
-        brands.push_back(
-            {ownPadded ? key : padBrandKey(key), ownPadded, key.length(), valueOffset, values.size() - valueOffset, nullptr});
+        brands.push_back({ownPadded ? key : padBrandKey(key), ownPadded, key.length(), valueOffset,
+                          values.size() - valueOffset, nullptr});
         storedFound = storedFound || (storedKey.length() != 0 && key == storedKey);
     });
     const auto valueOf = [&values](const Brand& brand) {
         return std::wstring_view(values.data() + brand.valueOffset, brand.valueLength);
     };
-    const auto keyOf = [](const Brand& brand) { return brand.padded.c_str() + (brand.padded.length() - brand.keyLength); };
+    const auto keyOf = [](const Brand& brand) {
+        return brand.padded.c_str() + (brand.padded.length() - brand.keyLength);
+    };
 
     SmartProxy<PBText> bText;
     if (!bText.acquire(ID(kBTextID)))
@@ -1063,10 +1066,10 @@ void ToolConfigurationCommand::saveUsersAndApp2App(std::string& written)
             if (value.type() != BData::eSTRING)
                 return;
             PublishedUser& user = published.back();
-            ACE_WString* field = key == L"name" ? &user.name
+            ACE_WString* field = key == L"name"      ? &user.name
                                  : key == L"address" ? &user.address
-                                 : key == L"phone" ? &user.phone
-                                                   : nullptr;
+                                 : key == L"phone"   ? &user.phone
+                                                     : nullptr;
             if (field != nullptr)
                 *field = static_cast<const BString&>(value).value();
         });

@@ -12,7 +12,6 @@
 #include "TesselLog_Static.h"
 #include "UsersUpdater.h"
 
-
 #include <QLineEdit>
 
 #include <memory>
