@@ -5,12 +5,31 @@
 #include <gtest/gtest.h>
 
 #include <atomic>
+#include <cctype>
 #include <memory>
-#include <regex>
+#include <sstream>
 #include <thread>
 
 namespace
 {
+// The log's lines without their time stamps ("YYYY-MM-DD hh:mm:ss.mmm "); a line without one is
+// kept whole, so a missing stamp shows in the comparison.
+std::string withoutStamps(const std::string& log)
+{
+    const std::string shape = "dddd-dd-dd dd:dd:dd.ddd ";
+    std::string result;
+    std::istringstream lines(log);
+    std::string line;
+    while (std::getline(lines, line))
+    {
+        bool stamped = line.size() >= shape.size();
+        for (std::size_t i = 0; stamped && i < shape.size(); ++i)
+            stamped = shape[i] == 'd' ? std::isdigit(static_cast<unsigned char>(line[i])) != 0 : line[i] == shape[i];
+        result += (stamped ? line.substr(shape.size()) : line) + "\n";
+    }
+    return result;
+}
+
 TEST(Logger, FileGetsAllLinesInRecordingModeAndOnlyProblemsOtherwise)
 {
     TempDir dir;
@@ -39,8 +58,7 @@ TEST(Logger, FileGetsAllLinesInRecordingModeAndOnlyProblemsOtherwise)
     ASSERT_TRUE(TesselLog_Static::setLogFile(ACE_WString()));
     logOneOfEach(); // goes to no file
     EXPECT_FALSE(TesselLog_Static::setLogFile(wide(dir.file("missing/x.log"))));
-    const std::regex stamp(R"((^|\n)\d{4}-\d\d-\d\d \d\d:\d\d:\d\d\.\d{3} )");
-    EXPECT_EQ(std::regex_replace(TempDir::read(path), stamp, "$1"), problems + all);
+    EXPECT_EQ(withoutStamps(TempDir::read(path)), problems + all);
 }
 
 // Sinks may log and remove themselves; removal waits for calls running on other threads,
