@@ -7,6 +7,7 @@
 #include "TesselLog_Static.h"
 #include "WideString.h"
 
+#include <charconv>
 #include <map>
 #include <mutex>
 #include <string>
@@ -20,22 +21,9 @@ const char* const kClass = "CBText";
 // A number's decimal text, as std::to_wstring writes it, without the C library's formatting.
 std::wstring decimal(int number)
 {
-    const long long value = number;
-    unsigned long long magnitude = value < 0 ? static_cast<unsigned long long>(-value) : value;
-    wchar_t digits[24];
-    size_t count = 0;
-    do
-    {
-        digits[count++] = static_cast<wchar_t>(L'0' + magnitude % 10);
-        magnitude /= 10;
-    } while (magnitude != 0);
-    std::wstring text;
-    text.reserve(count + 1);
-    if (value < 0)
-        text += L'-';
-    while (count > 0)
-        text += digits[--count];
-    return text;
+    char digits[16];
+    const char* end = std::to_chars(digits, digits + sizeof(digits), number).ptr;
+    return std::wstring(static_cast<const char*>(digits), end);
 }
 }
 

@@ -180,6 +180,20 @@ struct CDataManager::Impl
         return node;
     }
 
+    // Calls `use` with the set node at `segments`, under the lock.
+    template <class Use>
+    int withSet(const std::vector<ACE_WString>& segments, Use&& use) const
+    {
+        std::lock_guard<std::mutex> lock(mutex);
+        const Node* node = find(segments);
+        if (node == nullptr)
+            return eNO_SUCH_DATA;
+        if (!node->isSet())
+            return eWRONG_TYPE;
+        use(*node);
+        return eOK;
+    }
+
     // The set node holding the last segment; made on the way (replacing values) when `create`.
     Node* parentOf(const std::vector<ACE_WString>& segments, bool create)
     {
@@ -322,17 +336,11 @@ int CDataManager::visitValues(const ID& uri, const ValueVisitor& visit) const
         logNotDataUri("visitValues", uri);
         return eNOT_A_DATA_URI;
     }
-    const std::vector<ACE_WString> segments = segmentsOf(uri);
-    std::lock_guard<std::mutex> lock(m_impl->mutex);
-    const Node* node = m_impl->find(segments);
-    if (node == nullptr)
-        return eNO_SUCH_DATA;
-    if (!node->isSet())
-        return eWRONG_TYPE;
-    for (const auto& [name, child] : node->children)
-        if (!child->isSet())
-            visit(name, *child->value);
-    return eOK;
+    return m_impl->withSet(segmentsOf(uri), [&visit](const Node& node) {
+        for (const auto& [name, child] : node.children)
+            if (!child->isSet())
+                visit(name, *child->value);
+    });
 }
 
 int CDataManager::visitNestedValues(const ID& uri, int& entries, const NestedValueVisitor& visit) const
@@ -343,20 +351,14 @@ int CDataManager::visitNestedValues(const ID& uri, int& entries, const NestedVal
         logNotDataUri("visitNestedValues", uri);
         return eNOT_A_DATA_URI;
     }
-    const std::vector<ACE_WString> segments = segmentsOf(uri);
-    std::lock_guard<std::mutex> lock(m_impl->mutex);
-    const Node* node = m_impl->find(segments);
-    if (node == nullptr)
-        return eNO_SUCH_DATA;
-    if (!node->isSet())
-        return eWRONG_TYPE;
-    entries = static_cast<int>(node->children.size());
-    for (const auto& [setKey, set] : node->children)
-        if (set->isSet())
-            for (const auto& [name, child] : set->children)
-                if (!child->isSet())
-                    visit(setKey, name, *child->value);
-    return eOK;
+    return m_impl->withSet(segmentsOf(uri), [&entries, &visit](const Node& node) {
+        entries = static_cast<int>(node.children.size());
+        for (const auto& [setKey, set] : node.children)
+            if (set->isSet())
+                for (const auto& [name, child] : set->children)
+                    if (!child->isSet())
+                        visit(setKey, name, *child->value);
+    });
 }
 
 int CDataManager::setBool(const ID& uri, bool value)

@@ -4,6 +4,7 @@
 #include "WideString.h"
 
 #include <algorithm>
+#include <charconv>
 #include <climits>
 #include <cstddef>
 #include <cstdint>
@@ -407,16 +408,10 @@ ACE_WString StringUtilities::narrowVsprintf(const char* format, va_list args)
 
 ACE_WString StringUtilities::withNumber(const wchar_t* prefix, unsigned int number)
 {
-    wchar_t digits[16];
-    const size_t end = sizeof(digits) / sizeof(digits[0]);
-    size_t start = end;
-    do
-    {
-        digits[--start] = static_cast<wchar_t>(L'0' + number % 10);
-        number /= 10;
-    } while (number != 0);
+    char digits[16];
+    const char* end = std::to_chars(digits, digits + sizeof(digits), number).ptr;
     ACE_WString text(prefix);
-    text += ACE_WString(digits + start, end - start);
+    text += ACE_WString(std::wstring(static_cast<const char*>(digits), end).c_str());
     return text;
 }
 
