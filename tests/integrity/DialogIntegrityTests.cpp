@@ -46,13 +46,6 @@ protected:
         UsersCommand users(QStringLiteral("WC_USERSCOMMAND"));
         users.createDMUsersData();
     }
-
-    bool enabledFlag()
-    {
-        bool value = false;
-        EXPECT_EQ(m_dataManager->getBool(ID(Uri::kEnableOnlineUpdate), value), 0);
-        return value;
-    }
 };
 
 // Without a readable online-update file, OK keeps the App2App values the dialog never showed,
@@ -71,16 +64,11 @@ TEST_F(DialogIntegrityTest, OkWithoutOnlineUpdateFileKeepsApp2AppSwitchAndTask)
         republishUsers();
         m_command->onOKButtonClicked();
 
-        const BSet users = SettingsFiles::read(m_usersPath);
-        BSet app2App(10);
-        ASSERT_EQ(users.getSet(L"App2App"_w, app2App), 0);
-        EXPECT_EQ(SettingsFiles::stringAt(app2App, "Port"), "8080");
-        EXPECT_EQ(SettingsFiles::stringAt(app2App, "IP"), "10.0.0.7");
-        BSet attributes(10);
-        app2App.getSet(L"RequestAttributes"_w, attributes);
-        EXPECT_EQ(SettingsFiles::stringAt(attributes, "dealerId"), "D77");
+        EXPECT_EQ(app2AppIn(m_usersPath), "8080 10.0.0.7 D77");
         EXPECT_EQ(SettingsFiles::usersIn(m_usersPath), (std::vector<User>{kAnna, kBruno, kClara}));
-        EXPECT_FALSE(enabledFlag());
+        bool enabled = true;
+        EXPECT_EQ(m_dataManager->getBool(ID(Uri::kEnableOnlineUpdate), enabled), 0);
+        EXPECT_FALSE(enabled);
         EXPECT_FALSE(std::filesystem::exists(taskPath()));
         EXPECT_EQ(std::filesystem::exists(m_updatePath), !missing);
     }
@@ -104,10 +92,7 @@ TEST_F(DialogIntegrityTest, CancelWithMalformedWorkshopDiscardsEveryEdit)
     m_command->onOKButtonClicked();
 
     EXPECT_EQ(SettingsFiles::usersIn(m_usersPath), (std::vector<User>{kAnna, kBruno, kClara}));
-    const BSet users = SettingsFiles::read(m_usersPath);
-    BSet app2App(10);
-    users.getSet(L"App2App"_w, app2App);
-    EXPECT_EQ(SettingsFiles::stringAt(app2App, "Port"), "8080");
+    EXPECT_EQ(app2AppIn(m_usersPath), "8080 10.0.0.7 D77");
     const BSet update = SettingsFiles::read(m_updatePath);
     EXPECT_EQ(SettingsFiles::stringAt(update, "DeploymentMode"), "LOCAL");
     EXPECT_EQ(SettingsFiles::stringAt(update, "DistributionFolderPath"), "/srv/dist");

@@ -120,17 +120,9 @@ TEST_F(Publication, BrandItemsArePaddedAndSortedAndTheStoredDefaultIsSelected)
     m_text->setText(L"1"_w, L"One"_w);
     m_text->setText(L"2"_w, L"Two"_w);
     m_text->setText(L"10"_w, L"Ten"_w);
-    const auto items = [this]() {
-        BSet value;
-        record("BrandCombo").getSet(L"value"_w, value);
-        std::string result;
-        for (int i = 0; i < value.size(); ++i)
-            result += utf8(value.keyAt(i)) + "=" + SettingsFiles::stringAt(value, utf8(value.keyAt(i))) + " ";
-        return result;
-    };
     ToolConfigurationCommand& command = makeCommand();
     // Labels come from the texts, defaulting to the label under the padded key: only "0005" has one.
-    EXPECT_EQ(items(), "0001=One 0002=Two 0005=label 0005 0007= 0010=Ten ");
+    EXPECT_EQ(brandItems(), "0001=One 0002=Two 0005=label 0005 0007= 0010=Ten ");
     EXPECT_EQ(shown("BrandCombo"), "3|One");
     EXPECT_EQ(utf8(Access::workshop(command)->getDefaultBrand()), "One");
 
@@ -140,7 +132,7 @@ TEST_F(Publication, BrandItemsArePaddedAndSortedAndTheStoredDefaultIsSelected)
 
     ASSERT_EQ(m_dataManager->removeData(ID(Uri::kBrands)), 0);
     Access::createDMData(command, false);
-    EXPECT_EQ(items(), "");
+    EXPECT_EQ(brandItems(), "");
     EXPECT_EQ(shown("BrandCombo"), "3|");
 }
 
@@ -351,11 +343,6 @@ TEST_F(UpdateModeTest, ModeOfTheFileAndRadioButtonsSelectTheFolderShown)
                  {"OTHER", {local}, "100", "2|/var/local/repo", "LOCAL", "/srv/dist"},
                  {"OTHER", {a2a}, "010", "2|" + kShare, "A2A", kShare},
                  {"OTHER", {a2a, other}, "001", "3|" + kShare, "OTHER", kShare}};
-    // The radio buttons Local, A2A and Other as "100", "010" or "001".
-    const auto radios = [this]() {
-        return std::string() + "01"[flag("LocalRadioButton")] + "01"[flag("A2ARadioButton")] +
-               "01"[flag("OtherRadioButton")];
-    };
     for (const auto& c : cases)
     {
         SCOPED_TRACE(std::string(c.fileMode) + " then " + std::to_string(c.clicks.size()) + " clicks to " + c.mode);
@@ -443,14 +430,6 @@ bool taskExists()
     bool denied = false;
     EXPECT_TRUE(helper.checkTaskAvailableForCurrentUser(exists, denied));
     return exists;
-}
-
-// Port, address and dealer as the users file holds them.
-std::string app2AppIn(const std::string& usersPath)
-{
-    UsersUpdater file(wide(usersPath));
-    EXPECT_TRUE(file.load());
-    return utf8(file.getApp2AppPort() + L" "_w + file.getApp2AppIP() + L" "_w + file.getApp2AppDealerID());
 }
 
 TEST_F(CommitTest, RecordingModeFollowsTheBoxAndOkSetsTheLogLevelFromIt)
@@ -652,20 +631,8 @@ TEST_F(Publication, BrandItemsArePaddedSortedAndMergedWithTheirDefaultLabels)
     brands.setString(L"2"_w, L"Two"_w);
     ASSERT_EQ(m_dataManager->createData(ID(Uri::kBrands), brands), 0);
     ToolConfigurationCommand& command = makeCommand();
-    const BSet combo = record("BrandCombo");
-    BSet items;
-    ASSERT_EQ(combo.getSet(L"value"_w, items), 0);
-    std::string shownItems;
-    for (int i = 0; i < items.size(); ++i)
-    {
-        ACE_WString label;
-        items.getString(items.keyAt(i), label);
-        shownItems += utf8(items.keyAt(i)) + "=" + utf8(label) + " ";
-    }
-    EXPECT_EQ(shownItems, "0002=Marque B 0007=Zero seven 0012= ");
-    ACE_WString selected;
-    combo.getString(L"selected"_w, selected);
-    EXPECT_EQ(utf8(selected), "Marque B");
+    EXPECT_EQ(brandItems(), "0002=Marque B 0007=Zero seven 0012= ");
+    EXPECT_EQ(shown("BrandCombo"), "3|Marque B");
     EXPECT_EQ(utf8(Access::workshop(command)->getDefaultBrandKey()), "2");
 
     // Without a text, a short key's own value is its text: "12" shows "Douze", not the item's label.
