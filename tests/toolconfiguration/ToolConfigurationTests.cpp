@@ -39,13 +39,10 @@ TEST_F(Publication, RecordsShowTheFilesTheConfigurationAndTheIniFile)
     const std::string ini = m_dir.file("Applet/conf_hf.ini");
     TempDir::write(ini, "[TEST]\nFlag_HF=1\nNetWork=192.168.1.4\n[REPROGRAMMATION]\nNom_Browser1=viewer\n");
     m_text->setText(L"3"_w, wide("Three \xF0\x9D\x84\x9E"));
-    const std::pair<const wchar_t*, std::string> configuration[] = {
-        {kIniUri, ini},
-        {kVersion, "V#3"},
-        {kFormation, "F1"},
-        {L"data:/Configuration/MenuBar/ToolConfigData/DiagnosticURL", "http://diag"}};
-    for (const auto& [uri, value] : configuration)
-        setConfig(uri, value);
+    setConfig(kIniUri, ini);
+    setConfig(kVersion, "V#3");
+    setConfig(kFormation, "F1");
+    setConfig(L"data:/Configuration/MenuBar/ToolConfigData/DiagnosticURL", "http://diag");
     ToolConfigurationCommand& command = makeCommand();
     const std::pair<const char*, const char*> expected[] = {{"ProjectNumberEdit", "3|BN-42"},
                                                             {"CompanyNameEdit", "3|Garage du Pont"},
@@ -570,21 +567,16 @@ TEST_F(Publication, CancelAndAChangedUsersFilePublishTheUsersOnce)
     EXPECT_EQ(publishedUsers(*m_dataManager), (std::vector<User>{kAnna, kBruno, kClara}));
 }
 
-struct OwnSaveCase
-{
-    const char* label;
-    char file; // 'w'orkshop, 'u'sers, 'p'reparateur
-};
-
-class OwnSave : public ToolConfigurationTest, public ::testing::WithParamInterface<OwnSaveCase>
+// The file: 'w'orkshop, 'u'sers or u'p'date.
+class OwnSave : public ToolConfigurationTest, public ::testing::WithParamInterface<char>
 {};
 
 // The watcher's reports of OK's own save leave the dialog as it is; an outside edit of the same
 // file rebuilds it, and so does a later return to the saved content.
 TEST_P(OwnSave, ReportOfOwnSaveRebuildsNothingWhileAnOutsideEditDoes)
 {
-    const OwnSaveCase& c = GetParam();
-    const std::string path = c.file == 'w' ? m_workshopPath : c.file == 'u' ? m_usersPath : m_updatePath;
+    const char file = GetParam();
+    const std::string path = file == 'w' ? m_workshopPath : file == 'u' ? m_usersPath : m_updatePath;
     ToolConfigurationCommand& command = makeCommand();
     ASSERT_TRUE(command.init());
     command.onOKButtonClicked();
@@ -599,14 +591,14 @@ TEST_P(OwnSave, ReportOfOwnSaveRebuildsNothingWhileAnOutsideEditDoes)
     EXPECT_EQ(report(), 0);
     EXPECT_EQ(report(), 0) << "a second report of the same save";
 
-    if (c.file == 'w')
+    if (file == 'w')
         SettingsFiles::writeWorkshop(path, {{"nom", "Renamed"}});
-    else if (c.file == 'u')
+    else if (file == 'u')
         SettingsFiles::writeUsers(path, {kLukasz});
     else
         SettingsFiles::writeUpdate(path, SettingsFiles::Update{true, "OTHER", "/srv/other", "/var/repo", "09:15:00"});
     EXPECT_GT(report(), 0);
-    if (c.file == 'w')
+    if (file == 'w')
     {
         EXPECT_EQ(shown("NameEdit"), "3|Renamed");
     }
@@ -615,10 +607,9 @@ TEST_P(OwnSave, ReportOfOwnSaveRebuildsNothingWhileAnOutsideEditDoes)
     m_dataManager->removeListener(listener);
 }
 
-INSTANTIATE_TEST_SUITE_P(Files, OwnSave,
-                         ::testing::Values(OwnSaveCase{"Workshop", 'w'}, OwnSaveCase{"Users", 'u'},
-                                           OwnSaveCase{"Update", 'p'}),
-                         [](const auto& info) { return std::string(info.param.label); });
+INSTANTIATE_TEST_SUITE_P(Files, OwnSave, ::testing::Values('w', 'u', 'p'), [](const auto& info) {
+    return std::string(info.param == 'w' ? "Workshop" : info.param == 'u' ? "Users" : "Update");
+});
 
 // Brand items are keyed by the padded brand key, in its order; a brand without a text shows the
 // value under its padded key, and keys that pad alike make one item.
