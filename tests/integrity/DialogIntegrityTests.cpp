@@ -30,14 +30,6 @@ public:
     static Dialog_ConfigurationTestBase& waitDialog(OnLineUpdateCommand& c) { return c.m_waitDialog; }
 };
 
-namespace
-{
-std::string taskPath()
-{
-    return TaskFile::pathOf(std::wstring(L"VEXAPreparerTask_") + EffectiveUser::loginName());
-}
-}
-
 class DialogIntegrityTest : public ToolConfigurationTest
 {
 protected:
@@ -69,7 +61,7 @@ TEST_F(DialogIntegrityTest, OkWithoutOnlineUpdateFileKeepsApp2AppSwitchAndTask)
         bool enabled = true;
         EXPECT_EQ(m_dataManager->getBool(ID(Uri::kEnableOnlineUpdate), enabled), 0);
         EXPECT_FALSE(enabled);
-        EXPECT_FALSE(std::filesystem::exists(taskPath()));
+        EXPECT_FALSE(std::filesystem::exists(TaskFile::pathOf(L"VEXAPreparerTask_" + EffectiveUser::loginName())));
         EXPECT_EQ(std::filesystem::exists(m_updatePath), !missing);
     }
 }
