@@ -320,10 +320,10 @@ TEST(HostApplicationTest, RunsWithoutADisplayAndRefusesBadArguments)
 {
     TempDir dir;
     std::filesystem::copy(PTC_DEMO_DIR, dir.path(), std::filesystem::copy_options::recursive);
+    const QString data = QString::fromStdString(dir.path().string());
     const QString screenshot = QString::fromStdString(dir.file("window.png"));
     std::string output;
-    EXPECT_EQ(runHost({"--data", QString::fromStdString(dir.path().string()), "--screenshot", screenshot, "--set",
-                       "NameEdit=Scripted Name", "--press", "ok"},
+    EXPECT_EQ(runHost({"--data", data, "--screenshot", screenshot, "--set", "NameEdit=Scripted Name", "--press", "ok"},
                       &output),
               0);
     EXPECT_NE(output.find("Screenshot: " + screenshot.toStdString()), std::string::npos) << output;
@@ -336,10 +336,10 @@ TEST(HostApplicationTest, RunsWithoutADisplayAndRefusesBadArguments)
     std::filesystem::remove_all(dir.file("User/OnLineUpdate"));
     TempDir::write(dir.file("User/OnLineUpdate"), "a file where the folder was");
     std::string errors;
-    EXPECT_EQ(runHost({"--data", QString::fromStdString(dir.path().string()), "--press", "ok"}, &output, &errors), 3);
+    EXPECT_EQ(runHost({"--data", data, "--press", "ok"}, &output, &errors), 3);
     EXPECT_NE(errors.find("Cannot save Preparateur data!"), std::string::npos) << errors;
 
-    EXPECT_EQ(runHost({"--data", QString::fromStdString(dir.path().string()), "--list-controls"}, &output), 0);
+    EXPECT_EQ(runHost({"--data", data, "--list-controls"}, &output), 0);
     EXPECT_NE(output.find("NameEdit: text\n"), std::string::npos) << output;
     EXPECT_EQ(output.find("Country"), std::string::npos) << "display-only fields cannot be set";
     EXPECT_EQ(runHost({"--help"}, &output), 0);

@@ -146,9 +146,7 @@ TEST_F(EndToEndTest, EditsThenOkWriteTheFilesAndTheTaskAndAReopenedDialogShowsTh
         EXPECT_EQ(shown(name), shownText) << name;
     EXPECT_EQ(SettingsFiles::stringAt(SettingsFiles::read(m_workshopPath), "default_brand"), "2");
     EXPECT_TRUE(flag("CheckInternet"));
-    EXPECT_EQ(std::string() + "01"[flag("LocalRadioButton")] + "01"[flag("A2ARadioButton")] +
-                  "01"[flag("OtherRadioButton")],
-              "001");
+    EXPECT_EQ(radios(), "001");
     EXPECT_EQ(text(Uri::kTaskTime), "21:15:00");
     EXPECT_EQ(SettingsFiles::usersIn(m_usersPath), (std::vector<User>{kBrunoChanged, kClara, kLukasz}));
     EXPECT_EQ(publishedUsers(*m_dataManager), (std::vector<User>{kBrunoChanged, kClara, kLukasz}));
@@ -172,9 +170,7 @@ TEST_F(EndToEndTest, EditsThenCancelLeaveTheFilesUnchangedAndShowThemAgain)
     // OK then saves what the files hold, not the cancelled edits.
     m_command->onOKButtonClicked();
     EXPECT_EQ(SettingsFiles::usersIn(m_usersPath), (std::vector<User>{kAnna, kBruno, kClara}));
-    UsersUpdater users(wide(m_usersPath));
-    ASSERT_TRUE(users.load());
-    EXPECT_EQ(utf8(users.getApp2AppIP() + L" "_w + users.getApp2AppDealerID()), "10.0.0.7 D77");
+    EXPECT_EQ(app2AppIn(m_usersPath), "8080 10.0.0.7 D77");
 }
 
 namespace

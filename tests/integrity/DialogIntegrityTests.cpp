@@ -30,14 +30,6 @@ public:
     static Dialog_ConfigurationTestBase& waitDialog(OnLineUpdateCommand& c) { return c.m_waitDialog; }
 };
 
-namespace
-{
-std::string taskPath()
-{
-    return TaskFile::pathOf(std::wstring(L"VEXAPreparerTask_") + EffectiveUser::loginName());
-}
-}
-
 class DialogIntegrityTest : public ToolConfigurationTest
 {
 protected:
@@ -45,13 +37,6 @@ protected:
     {
         UsersCommand users(QStringLiteral("WC_USERSCOMMAND"));
         users.createDMUsersData();
-    }
-
-    bool enabledFlag()
-    {
-        bool value = false;
-        EXPECT_EQ(m_dataManager->getBool(ID(Uri::kEnableOnlineUpdate), value), 0);
-        return value;
     }
 };
 
@@ -71,17 +56,12 @@ TEST_F(DialogIntegrityTest, OkWithoutOnlineUpdateFileKeepsApp2AppSwitchAndTask)
         republishUsers();
         m_command->onOKButtonClicked();
 
-        const BSet users = SettingsFiles::read(m_usersPath);
-        BSet app2App(10);
-        ASSERT_EQ(users.getSet(L"App2App"_w, app2App), 0);
-        EXPECT_EQ(SettingsFiles::stringAt(app2App, "Port"), "8080");
-        EXPECT_EQ(SettingsFiles::stringAt(app2App, "IP"), "10.0.0.7");
-        BSet attributes(10);
-        app2App.getSet(L"RequestAttributes"_w, attributes);
-        EXPECT_EQ(SettingsFiles::stringAt(attributes, "dealerId"), "D77");
+        EXPECT_EQ(app2AppIn(m_usersPath), "8080 10.0.0.7 D77");
         EXPECT_EQ(SettingsFiles::usersIn(m_usersPath), (std::vector<User>{kAnna, kBruno, kClara}));
-        EXPECT_FALSE(enabledFlag());
-        EXPECT_FALSE(std::filesystem::exists(taskPath()));
+        bool enabled = true;
+        EXPECT_EQ(m_dataManager->getBool(ID(Uri::kEnableOnlineUpdate), enabled), 0);
+        EXPECT_FALSE(enabled);
+        EXPECT_FALSE(std::filesystem::exists(TaskFile::pathOf(L"VEXAPreparerTask_" + EffectiveUser::loginName())));
         EXPECT_EQ(std::filesystem::exists(m_updatePath), !missing);
     }
 }
@@ -104,10 +84,7 @@ TEST_F(DialogIntegrityTest, CancelWithMalformedWorkshopDiscardsEveryEdit)
     m_command->onOKButtonClicked();
 
     EXPECT_EQ(SettingsFiles::usersIn(m_usersPath), (std::vector<User>{kAnna, kBruno, kClara}));
-    const BSet users = SettingsFiles::read(m_usersPath);
-    BSet app2App(10);
-    users.getSet(L"App2App"_w, app2App);
-    EXPECT_EQ(SettingsFiles::stringAt(app2App, "Port"), "8080");
+    EXPECT_EQ(app2AppIn(m_usersPath), "8080 10.0.0.7 D77");
     const BSet update = SettingsFiles::read(m_updatePath);
     EXPECT_EQ(SettingsFiles::stringAt(update, "DeploymentMode"), "LOCAL");
     EXPECT_EQ(SettingsFiles::stringAt(update, "DistributionFolderPath"), "/srv/dist");
@@ -129,50 +106,26 @@ TEST_F(DialogIntegrityTest, UsersAfterAFreeSlotAreListedAndKept)
     EXPECT_EQ(SettingsFiles::usersIn(m_usersPath), (std::vector<User>{kAnna, kBruno, kClara}));
 }
 
-struct TaskTimeCase
-{
-    const char* name;
-    const char* text;
-    const char* hour; // null: invalid
-    const char* minute;
-};
-
-class TaskTimeTest : public ComponentFixture, public ::testing::WithParamInterface<TaskTimeCase>
-{};
+using TaskTimeTest = ComponentFixture;
 
 // Only hh:mm or hh:mm:ss within the day make a task; anything else gives the invalid defaults
 // and an error line that shows the text as it is, never as a format.
-TEST_P(TaskTimeTest, OnlyAWellFormedTimeMakesATask)
+TEST_F(TaskTimeTest, OnlyAWellFormedTimeMakesATask)
 {
-    const TaskTimeCase& c = GetParam();
-    setConfig(Uri::kTaskTime, c.text);
-    LogCapture log;
-    const ScheduledTaskParams params = getScheduledTaskParamsFromDM();
-    if (c.hour == nullptr)
+    // The text, and the hour and minute it gives ("" when invalid).
+    const char* const cases[][2] = {{"07:30", "07|30"}, {"23:59:59", "23|59"}, {"%s%s", ""},  {"%n%n%s%s%S", ""},
+                                    {"7:30:00", ""},    {"24:00", ""},         {"07:60", ""}, {"07:30:60", ""},
+                                    {"07:30:0", ""},    {"ab:cd", ""}};
+    for (const auto& [text, time] : cases)
     {
-        EXPECT_FALSE(params.isValid());
-        EXPECT_TRUE(log.containsSubstring("task time '" + std::string(c.text) + "'"));
-    }
-    else
-    {
-        EXPECT_TRUE(params.isValid());
-        EXPECT_EQ(utf8(params.startHour()), c.hour);
-        EXPECT_EQ(utf8(params.startMinute()), c.minute);
+        SCOPED_TRACE(text);
+        setConfig(Uri::kTaskTime, text);
+        LogCapture log;
+        const ScheduledTaskParams params = getScheduledTaskParamsFromDM();
+        EXPECT_EQ(params.isValid() ? utf8(params.startHour()) + "|" + utf8(params.startMinute()) : "", time);
+        EXPECT_TRUE(*time != '\0' || log.containsSubstring("task time '" + std::string(text) + "'"));
     }
 }
-
-INSTANTIATE_TEST_SUITE_P(Times, TaskTimeTest,
-                         ::testing::Values(TaskTimeCase{"HourMinute", "07:30", "07", "30"},
-                                           TaskTimeCase{"WithSeconds", "23:59:59", "23", "59"},
-                                           TaskTimeCase{"FormatInShortText", "%s%s", nullptr, nullptr},
-                                           TaskTimeCase{"FormatInLongText", "%n%n%s%s%S", nullptr, nullptr},
-                                           TaskTimeCase{"OneDigitHour", "7:30:00", nullptr, nullptr},
-                                           TaskTimeCase{"HourOutOfDay", "24:00", nullptr, nullptr},
-                                           TaskTimeCase{"MinuteOutOfHour", "07:60", nullptr, nullptr},
-                                           TaskTimeCase{"SecondsOutOfMinute", "07:30:60", nullptr, nullptr},
-                                           TaskTimeCase{"ShortSeconds", "07:30:0", nullptr, nullptr},
-                                           TaskTimeCase{"Letters", "ab:cd", nullptr, nullptr}),
-                         [](const auto& info) { return std::string(info.param.name); });
 
 // Runtime text with conversions reaches the log as it is, in every field that is logged.
 TEST_F(DialogIntegrityTest, RuntimeTextIsNeverAFormat)

@@ -19,6 +19,7 @@
 #include <climits>
 #include <filesystem>
 #include <string>
+#include <tuple>
 
 namespace
 {
@@ -39,37 +40,6 @@ std::string nameIn(const std::string& path)
 }
 }
 
-struct EncodingCase
-{
-    const char* name;
-    std::string bytes;
-    const char* expected; // the name read, or "<not loaded>"
-    const char* logged;   // part of the warning, when refused
-};
-
-class EncodingTest : public ::testing::TestWithParam<EncodingCase>
-{};
-
-// A declared encoding is honoured; an undeclared file with bytes that are not UTF-8 is refused
-// with the offset of the first bad byte, and never overwritten.
-TEST_P(EncodingTest, DeclaredEncodingIsHonouredAndBadUtf8Refused)
-{
-    const EncodingCase& c = GetParam();
-    TempDir dir;
-    const std::string path = dir.file("FicheDiagParams.xml");
-    TempDir::write(path, c.bytes);
-    LogCapture log;
-    EXPECT_EQ(nameIn(path), c.expected);
-    if (std::string(c.expected) == "<not loaded>")
-    {
-        EXPECT_TRUE(log.containsSubstring(c.logged)) << "log has no '" << c.logged << "'";
-        UsersUpdater store(wide(path));
-        EXPECT_FALSE(store.load());
-        EXPECT_FALSE(store.save());
-        EXPECT_EQ(TempDir::read(path), c.bytes);
-    }
-}
-
 std::string utf16le(const std::string& ascii)
 {
     std::string out = "\xFF\xFE";
@@ -81,18 +51,38 @@ std::string utf16le(const std::string& ascii)
     return out;
 }
 
-INSTANTIATE_TEST_SUITE_P(
-    Files, EncodingTest,
-    ::testing::Values(
-        EncodingCase{"Utf8Declared", document("UTF-8", "Chlo\xC3\xA9"), "Chloé", ""},
-        EncodingCase{"Utf8ByteOrderMark", "\xEF\xBB\xBF" + document("", "Chlo\xC3\xA9"), "Chloé", ""},
-        EncodingCase{"Latin1Declared", document("ISO-8859-1", "Chlo\xE9"), "Chloé", ""},
-        EncodingCase{"Windows1252Declared", document("windows-1252", "\x80 Chlo\xE9"), "€ Chloé", ""},
-        EncodingCase{"Utf16WithByteOrderMark", utf16le(document("UTF-16", "Chloe")), "Chloe", ""},
-        EncodingCase{"Latin1Undeclared", document("", "Chlo\xE9"), "<not loaded>", "invalid UTF-8 at byte offset 50"},
-        EncodingCase{"BadUtf8Declared", document("UTF-8", "Chlo\xC3"), "<not loaded>", "invalid UTF-8 at byte offset"},
-        EncodingCase{"UnknownEncoding", document("KOI8-R", "x"), "<not loaded>", "unsupported encoding 'koi8-r'"}),
-    [](const auto& info) { return std::string(info.param.name); });
+// A declared encoding is honoured; an undeclared file with bytes that are not UTF-8 is refused
+// with the offset of the first bad byte, and never overwritten.
+TEST(EncodingTest, DeclaredEncodingIsHonouredAndBadUtf8Refused)
+{
+    // The file's bytes, the name read (or "<not loaded>") and part of the warning when refused.
+    const std::tuple<const char*, std::string, const char*, const char*> cases[] = {
+        {"Utf8Declared", document("UTF-8", "Chlo\xC3\xA9"), "Chloé", ""},
+        {"Utf8ByteOrderMark", "\xEF\xBB\xBF" + document("", "Chlo\xC3\xA9"), "Chloé", ""},
+        {"Latin1Declared", document("ISO-8859-1", "Chlo\xE9"), "Chloé", ""},
+        {"Windows1252Declared", document("windows-1252", "\x80 Chlo\xE9"), "€ Chloé", ""},
+        {"Utf16WithByteOrderMark", utf16le(document("UTF-16", "Chloe")), "Chloe", ""},
+        {"Latin1Undeclared", document("", "Chlo\xE9"), "<not loaded>", "invalid UTF-8 at byte offset 50"},
+        {"BadUtf8Declared", document("UTF-8", "Chlo\xC3"), "<not loaded>", "invalid UTF-8 at byte offset"},
+        {"UnknownEncoding", document("KOI8-R", "x"), "<not loaded>", "unsupported encoding 'koi8-r'"}};
+    TempDir dir;
+    const std::string path = dir.file("FicheDiagParams.xml");
+    for (const auto& [name, bytes, expected, logged] : cases)
+    {
+        SCOPED_TRACE(name);
+        TempDir::write(path, bytes);
+        LogCapture log;
+        EXPECT_EQ(nameIn(path), expected);
+        if (std::string(expected) == "<not loaded>")
+        {
+            EXPECT_TRUE(log.containsSubstring(logged)) << "log has no '" << logged << "'";
+            UsersUpdater store(wide(path));
+            EXPECT_FALSE(store.load());
+            EXPECT_FALSE(store.save());
+            EXPECT_EQ(TempDir::read(path), bytes);
+        }
+    }
+}
 
 TEST(SettingsFileTest, BackslashPathsSaveAndLoadTheSameFile)
 {

@@ -34,6 +34,14 @@ public:
     static bool updateAgentAcquired(ToolConfigurationCommand& c) { return c.m_procStartUpdateAgent.isAvailable(); }
 };
 
+// Port, address and dealer as the users file holds them.
+inline std::string app2AppIn(const std::string& usersPath)
+{
+    UsersUpdater file(wide(usersPath));
+    EXPECT_TRUE(file.load());
+    return utf8(file.getApp2AppPort() + L" "_w + file.getApp2AppIP() + L" "_w + file.getApp2AppDealerID());
+}
+
 // A controller over the dialog fixture's files, and readers of the records it publishes.
 class ToolConfigurationTest : public DialogFixture
 {
@@ -82,6 +90,22 @@ protected:
             value.getString(L"item"_w, first);
         }
         return std::to_string(state) + "|" + utf8(first);
+    }
+    // The radio buttons Local, A2A and Other as "100", "010" or "001".
+    std::string radios() const
+    {
+        return std::string() + "01"[flag("LocalRadioButton")] + "01"[flag("A2ARadioButton")] +
+               "01"[flag("OtherRadioButton")];
+    }
+    // The brand combo's items as "key=label ".
+    std::string brandItems() const
+    {
+        BSet value;
+        record("BrandCombo").getSet(L"value"_w, value);
+        std::string result;
+        for (int i = 0; i < value.size(); ++i)
+            result += utf8(value.keyAt(i)) + "=" + SettingsFiles::stringAt(value, utf8(value.keyAt(i))) + " ";
+        return result;
     }
     bool flag(const std::string& name) const
     {
