@@ -131,25 +131,20 @@ protected:
 };
 }
 
-TEST_F(CronTaskLayer, SaveReplaceAndDeleteKeepTheUsersLines)
+// A task whose line is gone or was edited reads as disabled.
+TEST_F(CronTaskLayer, SaveReplaceAndDeleteKeepTheUsersLinesAndAMissingOrChangedLineDisables)
 {
     ASSERT_EQ(S_OK, save(7, 30));
     EXPECT_EQ(withLine("30 7"), CronUser::table(m_user));
     EXPECT_FALSE(disabled());
-    ASSERT_EQ(S_OK, save(21, 5));
-    EXPECT_EQ(withLine("5 21"), CronUser::table(m_user));
-    EXPECT_EQ(S_OK, TaskFile::remove(L"Daily"));
-    EXPECT_EQ(kForeign, CronUser::table(m_user));
-}
-
-// A task whose line is gone or was edited reads as disabled.
-TEST_F(CronTaskLayer, MissingOrChangedLineReadsAsDisabled)
-{
-    ASSERT_EQ(S_OK, save(7, 30));
     CronUser::setTable(m_user, kForeign);
     EXPECT_TRUE(disabled());
     CronUser::setTable(m_user, withLine("31 7"));
     EXPECT_TRUE(disabled());
+    ASSERT_EQ(S_OK, save(21, 5));
+    EXPECT_EQ(withLine("5 21"), CronUser::table(m_user));
+    EXPECT_EQ(S_OK, TaskFile::remove(L"Daily"));
+    EXPECT_EQ(kForeign, CronUser::table(m_user));
 }
 
 // Either write failing leaves both the task file and the crontab as they were.
