@@ -2,6 +2,7 @@
 #include "CronUser.h"
 #include "TaskFile.h"
 #include "TempDir.h"
+#include "Triggers.h"
 #include "Win32Service.h"
 
 #include <gtest/gtest.h>
@@ -15,12 +16,7 @@ namespace
 TaskRecord dailyTask(const std::wstring& application, const std::wstring& parameters, WORD hour, WORD minute)
 {
     TaskRecord record;
-    record.applicationName = application, record.parameters = parameters;
-    record.triggers.resize(1);
-    TASK_TRIGGER& t = record.triggers[0];
-    std::memset(&t, 0, sizeof t);
-    t.cbTriggerSize = sizeof t, t.TriggerType = TASK_TIME_TRIGGER_DAILY, t.Type.Daily.DaysInterval = 1;
-    t.wBeginYear = 2025, t.wBeginMonth = 6, t.wBeginDay = 30, t.wStartHour = hour, t.wStartMinute = minute;
+    record.applicationName = application, record.parameters = parameters, record.triggers = {makeTrigger(hour, minute)};
     return record;
 }
 

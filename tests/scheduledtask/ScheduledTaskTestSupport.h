@@ -9,11 +9,11 @@
 #include "TaskSchedulerFaults.h"
 #include "TempDir.h"
 #include "TestText.h"
+#include "Triggers.h"
 #include "Win32Service.h"
 
 #include <gtest/gtest.h>
 
-#include <cstring>
 #include <vector>
 
 using namespace OnlineUpdateCommand_NS;
@@ -66,13 +66,7 @@ public:
     static TASK_TRIGGER trigger(TASK_TRIGGER_TYPE type, WORD hour, WORD minute, WORD year = 2024, WORD month = 3,
                                 WORD day = 14)
     {
-        TASK_TRIGGER t;
-        std::memset(&t, 0, sizeof t);
-        t.cbTriggerSize = sizeof(TASK_TRIGGER);
-        t.wBeginYear = year, t.wBeginMonth = month, t.wBeginDay = day, t.wStartHour = hour, t.wStartMinute = minute;
-        t.TriggerType = type;
-        t.Type.Daily.DaysInterval = 1; // in the place of a weekly trigger's WeeksInterval
-        return t;
+        return makeTrigger(hour, minute, 1, type, year, month, day);
     }
 
     // A task record as the helper writes it for the standard parameters.
