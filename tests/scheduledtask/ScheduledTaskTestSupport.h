@@ -72,13 +72,11 @@ public:
     // A task record as the helper writes it for the standard parameters.
     static TaskRecord goodRecord()
     {
-        return {kApp,
-                L"preparer",
-                user(),
-                L"",
-                TASK_FLAG_INTERACTIVE | TASK_FLAG_RUN_ONLY_IF_LOGGED_ON,
-                SCHED_S_TASK_HAS_NOT_RUN,
-                {trigger(TASK_TIME_TRIGGER_DAILY, 7, 5)}};
+        TaskRecord record;
+        record.applicationName = kApp, record.parameters = L"preparer", record.account = user();
+        record.flags = TASK_FLAG_INTERACTIVE | TASK_FLAG_RUN_ONLY_IF_LOGGED_ON;
+        record.triggers = {trigger(TASK_TIME_TRIGGER_DAILY, 7, 5)};
+        return record;
     }
 
     // Writes the task file directly, as the scheduler would, owned by `owner` (default: the user).
