@@ -36,24 +36,19 @@ std::string asCronRuns(const std::string& command)
 }
 }
 
-// Each hostile word reaches the program as it was: through cron's '%' handling and the shell.
-TEST(CronLine, WordsReachTheProgramUnchanged)
+// Each hostile word reaches the program as it was: through cron's '%' handling and the shell. Then
+// the whole line; a line break in any field, or a '#' in the name, is refused.
+TEST(CronLine, WordsReachTheProgramUnchangedAndBadFieldsAreRefused)
 {
+    std::string line;
     for (const char* word : {"it's", "50%", "a\\%b", "\\", "%%", "\\\\%", "$(id)", "`id`", ";", "\"", "'%'", "#", "*"})
     {
-        std::string line;
         const std::wstring parameters = L"[%s] " + std::wstring(word, word + std::strlen(word));
         ASSERT_EQ(S_OK, CronTable::lineFor(L"Task", dailyTask(L"/usr/bin/printf", parameters, 7, 30), line));
         ASSERT_EQ(0u, line.find("30 7 * * * ")) << line;
         const auto run = ChildProcess::run({"/bin/sh", "-c", asCronRuns(line.substr(11))}, std::string(), 10000);
         EXPECT_EQ("[" + std::string(word) + "]", run.output) << line;
     }
-}
-
-// The whole line; a line break in any field, or a '#' in the name, is refused.
-TEST(CronLine, ShapeAndRefusedFields)
-{
-    std::string line;
     TaskRecord record = dailyTask(L"/opt/agent dir/agent.sh", L" preparer  50% ", 7, 5);
     record.triggers[0].Type.Daily.DaysInterval = 3;
     EXPECT_EQ(S_OK, CronTable::lineFor(L"Daily % 1", record, line));
