@@ -9,6 +9,7 @@
 #include <memory>
 #include <sstream>
 #include <thread>
+#include <tuple>
 
 namespace
 {
@@ -110,16 +111,9 @@ TEST(Logger, LineIsRecordedOnlyWhenTheFileOrASinkTakesIt)
 {
     TempDir dir;
     const std::string path = dir.file("levels.log");
-    struct Case
-    {
-        bool file;
-        int sinkLevel; // 0: no sink
-        int verbosity;
-        int level;
-        bool recorded;
-    };
     const int trace = TesselLog_Static::eTRACE, warning = TesselLog_Static::eWARNING;
-    const Case cases[] = {
+    // to a file, the sink's level (0: no sink), the verbosity, the line's level, recorded
+    const std::tuple<bool, int, int, int, bool> cases[] = {
         {false, 0, 10, TesselLog_Static::eERROR, false},
         {true, 0, 10, trace, true},
         {true, 0, 0, trace, false},
@@ -131,19 +125,19 @@ TEST(Logger, LineIsRecordedOnlyWhenTheFileOrASinkTakesIt)
         {false, warning, 10, trace, false},
         {false, warning, 0, warning, true},
     };
-    for (const Case& c : cases)
+    for (const auto& [file, sinkLevel, verbosity, level, recorded] : cases)
     {
-        ASSERT_TRUE(TesselLog_Static::setLogFile(c.file ? wide(path) : ACE_WString()));
-        TesselLog_Static::setLevel_static(c.verbosity);
+        ASSERT_TRUE(TesselLog_Static::setLogFile(file ? wide(path) : ACE_WString()));
+        TesselLog_Static::setLevel_static(verbosity);
         int received = 0;
         const int sink =
-            c.sinkLevel == 0
+            sinkLevel == 0
                 ? 0
-                : TesselLog_Static::addSink([&received](const TesselLog_Static::Record&) { ++received; }, c.sinkLevel);
-        EXPECT_EQ(TesselLog_Static::isRecorded_static(c.level), c.recorded)
-            << c.file << c.sinkLevel << " verbosity " << c.verbosity << " level " << c.level;
-        TesselLog_Static::log_static(c.level, 0, "c", "f", "k", L"line");
-        EXPECT_EQ(received, c.sinkLevel != 0 && c.level >= c.sinkLevel ? 1 : 0) << "sink of level " << c.sinkLevel;
+                : TesselLog_Static::addSink([&received](const TesselLog_Static::Record&) { ++received; }, sinkLevel);
+        EXPECT_EQ(TesselLog_Static::isRecorded_static(level), recorded)
+            << file << sinkLevel << " verbosity " << verbosity << " level " << level;
+        TesselLog_Static::log_static(level, 0, "c", "f", "k", L"line");
+        EXPECT_EQ(received, sinkLevel != 0 && level >= sinkLevel ? 1 : 0) << "sink of level " << sinkLevel;
         TesselLog_Static::removeSink(sink);
     }
     TesselLog_Static::setLevel_static(10); // the last case left no file
