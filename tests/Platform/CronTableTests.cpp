@@ -2,6 +2,7 @@
 #include "CronUser.h"
 #include "TaskFile.h"
 #include "TempDir.h"
+#include "Triggers.h"
 #include "Win32Service.h"
 
 #include <gtest/gtest.h>
@@ -15,12 +16,7 @@ namespace
 TaskRecord dailyTask(const std::wstring& application, const std::wstring& parameters, WORD hour, WORD minute)
 {
     TaskRecord record;
-    record.applicationName = application, record.parameters = parameters;
-    record.triggers.resize(1);
-    TASK_TRIGGER& t = record.triggers[0];
-    std::memset(&t, 0, sizeof t);
-    t.cbTriggerSize = sizeof t, t.TriggerType = TASK_TIME_TRIGGER_DAILY, t.Type.Daily.DaysInterval = 1;
-    t.wBeginYear = 2025, t.wBeginMonth = 6, t.wBeginDay = 30, t.wStartHour = hour, t.wStartMinute = minute;
+    record.applicationName = application, record.parameters = parameters, record.triggers = {makeTrigger(hour, minute)};
     return record;
 }
 
@@ -40,24 +36,19 @@ std::string asCronRuns(const std::string& command)
 }
 }
 
-// Each hostile word reaches the program as it was: through cron's '%' handling and the shell.
-TEST(CronLine, WordsReachTheProgramUnchanged)
+// Each hostile word reaches the program as it was: through cron's '%' handling and the shell. Then
+// the whole line; a line break in any field, or a '#' in the name, is refused.
+TEST(CronLine, WordsReachTheProgramUnchangedAndBadFieldsAreRefused)
 {
+    std::string line;
     for (const char* word : {"it's", "50%", "a\\%b", "\\", "%%", "\\\\%", "$(id)", "`id`", ";", "\"", "'%'", "#", "*"})
     {
-        std::string line;
         const std::wstring parameters = L"[%s] " + std::wstring(word, word + std::strlen(word));
         ASSERT_EQ(S_OK, CronTable::lineFor(L"Task", dailyTask(L"/usr/bin/printf", parameters, 7, 30), line));
         ASSERT_EQ(0u, line.find("30 7 * * * ")) << line;
         const auto run = ChildProcess::run({"/bin/sh", "-c", asCronRuns(line.substr(11))}, std::string(), 10000);
         EXPECT_EQ("[" + std::string(word) + "]", run.output) << line;
     }
-}
-
-// The whole line; a line break in any field, or a '#' in the name, is refused.
-TEST(CronLine, ShapeAndRefusedFields)
-{
-    std::string line;
     TaskRecord record = dailyTask(L"/opt/agent dir/agent.sh", L" preparer  50% ", 7, 5);
     record.triggers[0].Type.Daily.DaysInterval = 3;
     EXPECT_EQ(S_OK, CronTable::lineFor(L"Daily % 1", record, line));
@@ -131,25 +122,20 @@ protected:
 };
 }
 
-TEST_F(CronTaskLayer, SaveReplaceAndDeleteKeepTheUsersLines)
+// A task whose line is gone or was edited reads as disabled.
+TEST_F(CronTaskLayer, SaveReplaceAndDeleteKeepTheUsersLinesAndAMissingOrChangedLineDisables)
 {
     ASSERT_EQ(S_OK, save(7, 30));
     EXPECT_EQ(withLine("30 7"), CronUser::table(m_user));
     EXPECT_FALSE(disabled());
-    ASSERT_EQ(S_OK, save(21, 5));
-    EXPECT_EQ(withLine("5 21"), CronUser::table(m_user));
-    EXPECT_EQ(S_OK, TaskFile::remove(L"Daily"));
-    EXPECT_EQ(kForeign, CronUser::table(m_user));
-}
-
-// A task whose line is gone or was edited reads as disabled.
-TEST_F(CronTaskLayer, MissingOrChangedLineReadsAsDisabled)
-{
-    ASSERT_EQ(S_OK, save(7, 30));
     CronUser::setTable(m_user, kForeign);
     EXPECT_TRUE(disabled());
     CronUser::setTable(m_user, withLine("31 7"));
     EXPECT_TRUE(disabled());
+    ASSERT_EQ(S_OK, save(21, 5));
+    EXPECT_EQ(withLine("5 21"), CronUser::table(m_user));
+    EXPECT_EQ(S_OK, TaskFile::remove(L"Daily"));
+    EXPECT_EQ(kForeign, CronUser::table(m_user));
 }
 
 // Either write failing leaves both the task file and the crontab as they were.

@@ -2,6 +2,7 @@
 #include "TaskFile.h"
 #include "TaskScheduler.h"
 #include "TempDir.h"
+#include "Triggers.h"
 #include "WideString.h"
 #include "Win32Service.h"
 #include "Win32System.h"
@@ -15,19 +16,9 @@
 
 namespace
 {
-// Zeroed first: records are compared byte for byte, padding included.
-TASK_TRIGGER daily(WORD hour, WORD minute = 0)
-{
-    TASK_TRIGGER t;
-    std::memset(&t, 0, sizeof t);
-    t.cbTriggerSize = sizeof t, t.TriggerType = TASK_TIME_TRIGGER_DAILY, t.Type.Daily.DaysInterval = 2;
-    t.wBeginYear = 2025, t.wBeginMonth = 6, t.wBeginDay = 30, t.wStartHour = hour, t.wStartMinute = minute;
-    return t;
-}
-
 TASK_TRIGGER read(ITaskTrigger* trigger, HRESULT expected = S_OK)
 {
-    TASK_TRIGGER record = daily(0);
+    TASK_TRIGGER record = makeTrigger(0, 0, 2);
     EXPECT_EQ(expected, trigger->GetTrigger(&record));
     return record;
 }
@@ -85,7 +76,7 @@ protected:
 TEST_F(TaskSchedulerLayer, SavedTriggersOfEveryKindReadBack)
 {
     ComPtr<ITask> created = task(L"Round trip \u00e9");
-    TASK_TRIGGER t[3] = {daily(0), daily(12, 30), daily(1, 1)};
+    TASK_TRIGGER t[3] = {makeTrigger(0, 0, 2), makeTrigger(12, 30, 2), makeTrigger(1, 1, 2)};
     t[0].TriggerType = TASK_TIME_TRIGGER_WEEKLY, t[0].Type.Weekly.WeeksInterval = 3;
     t[0].Type.Weekly.rgfDaysOfTheWeek = 0x41, t[1].TriggerType = TASK_TIME_TRIGGER_MONTHLYDATE;
     t[1].Type.MonthlyDate.rgfDays = 0x80000001u, t[1].Type.MonthlyDate.rgfMonths = 0xFFF;
@@ -113,12 +104,12 @@ TEST_F(TaskSchedulerLayer, TriggersKeepTheirIdentityAndRefuseBadRecords)
     ComPtr<ITask> created = task(L"Triggers");
     ComPtr<ITaskTrigger> triggers[3];
     for (WORD i = 0; i < 3; ++i)
-        triggers[i] = addTrigger(created.get(), daily(i + 1));
+        triggers[i] = addTrigger(created.get(), makeTrigger(i + 1, 0, 2));
     EXPECT_EQ(S_OK, created->DeleteTrigger(0));
     EXPECT_EQ(E_INVALIDARG, created->DeleteTrigger(2));
     ComPtr<ITaskTrigger> none;
     EXPECT_EQ(SCHED_E_TRIGGER_NOT_FOUND, created->GetTrigger(2, &none.ref()));
-    TASK_TRIGGER record = daily(1, 2);
+    TASK_TRIGGER record = makeTrigger(1, 2, 2);
     read(triggers[0].get(), SCHED_E_TRIGGER_NOT_FOUND);
     EXPECT_EQ(SCHED_E_TRIGGER_NOT_FOUND, triggers[0]->SetTrigger(&record));
     EXPECT_EQ(2, read(triggers[1].get()).wStartHour);
@@ -135,7 +126,7 @@ TEST_F(TaskSchedulerLayer, TriggersKeepTheirIdentityAndRefuseBadRecords)
         [](T t) { t.rgFlags = TASK_TRIGGER_FLAG_HAS_END_DATE, t.wEndMonth = 1, t.wEndDay = 32; }};
     for (const auto mutate : mutations)
     {
-        record = daily(1, 2);
+        record = makeTrigger(1, 2, 2);
         mutate(record);
         EXPECT_EQ(E_INVALIDARG, triggers[2]->SetTrigger(&record)) << record.wStartHour;
     }

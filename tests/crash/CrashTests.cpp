@@ -147,16 +147,10 @@ private:
     }
 }
 
-// The last step, of the `started` ones begun, that saves `file`; -1 when none.
-int lastStep(int file, int started)
-{
-    return started > file ? file + (started - 1 - file) / kFiles * kFiles : -1;
-}
-
 // What `file` may hold: the value of its last save begun, or of the one before it.
 std::set<std::string> allowedValues(int file, int round, int started)
 {
-    const int last = lastStep(file, started);
+    const int last = started > file ? file + (started - 1 - file) / kFiles * kFiles : -1; // -1: none begun
     if (last < 0)
         return {parentValue(round)};
     return {childValue(round, last), last >= kFiles ? childValue(round, last - kFiles) : parentValue(round)};
@@ -175,12 +169,6 @@ bool readProgress(int in, int wanted, int& started)
     }
     return true;
 }
-
-int killCount()
-{
-    const char* text = std::getenv("PTC_CRASH_KILLS");
-    return text != nullptr && std::atoi(text) > 0 ? std::atoi(text) : 40;
-}
 }
 
 // A child saves the four files in turn and is killed after a number of progress bytes drawn
@@ -192,7 +180,8 @@ TEST(CrashTest, SavesKilledAtVariedPointsLeaveWholeFiles)
     const Files files(dir.path().string());
     std::mt19937 random(20240611);
     std::uniform_int_distribution<int> stepsBeforeKill(1, 24);
-    const int kills = killCount();
+    const char* killsWanted = std::getenv("PTC_CRASH_KILLS");
+    const int kills = killsWanted != nullptr && std::atoi(killsWanted) > 0 ? std::atoi(killsWanted) : 40;
     int leftTemporary = 0;
     for (int round = 0; round < kills; ++round)
     {

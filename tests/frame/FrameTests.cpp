@@ -32,7 +32,7 @@ TEST(EntryPoints, OnlyTheFactoryQueryMakesAComponentAndAProxy)
 }
 
 // Two names, matched exactly, each giving a new controller on every call, also through the proxy.
-TEST(Factory, KnownNamesGiveNewControllers)
+TEST(Factory, KnownNamesGiveNewControllersAndItsProxyOnlyWhileItLives)
 {
     CToolConfigControllersFactory factory{kFactory};
     PToolConfigControllersFactory proxy(&factory);
@@ -45,15 +45,10 @@ TEST(Factory, KnownNamesGiveNewControllers)
         EXPECT_STREQ(first->metaObject()->className(), className);
     }
     EXPECT_EQ(Controller(factory.getControllerByName(L"wc_toolconfiguration"_w)), nullptr);
-}
-
-TEST(Proxy, AnswersNullForAnotherComponentClassOrOnceItsComponentIsDestroyed)
-{
+    // A proxy answers null for another component class, or once its component is destroyed.
     CComponent_Thread_NoRef other{ID("other:Library?Other")};
     EXPECT_EQ(Controller(PToolConfigControllersFactory(&other).getControllerByName(L"WC_TOOLCONFIGURATION"_w)),
               nullptr);
-    CToolConfigControllersFactory factory{kFactory};
-    PToolConfigControllersFactory proxy(&factory);
     LogCapture log;
     proxy.handleEvent(EventDestroyingComponent(ID("tessel:DM?DataManager"))); // another component's
     EXPECT_NE(Controller(proxy.getControllerByName(L"WC_TOOLCONFIGURATION"_w)), nullptr);

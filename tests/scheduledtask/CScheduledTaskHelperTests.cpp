@@ -30,14 +30,11 @@ TEST_F(ScheduledTaskTest, InvalidParamsAreRejectedFirst)
 // one daily trigger; creating over an absent task is in AvailabilityForTheCurrentUser.
 TEST_F(ScheduledTaskTest, CreateOverExistingTaskReplacesItUnlessItMustFail)
 {
-    writeTask({L"/old/app",
-               L"old",
-               user(),
-               L"",
-               0x4,
-               SCHED_S_TASK_HAS_NOT_RUN,
-               {trigger(TASK_TIME_TRIGGER_WEEKLY, 1, 0), trigger(TASK_TIME_TRIGGER_DAILY, 2, 0),
-                trigger(TASK_TIME_TRIGGER_ONCE, 3, 0)}});
+    TaskRecord old;
+    old.applicationName = L"/old/app", old.parameters = L"old", old.account = user(), old.flags = 0x4;
+    old.triggers = {trigger(TASK_TIME_TRIGGER_WEEKLY, 1, 0), trigger(TASK_TIME_TRIGGER_DAILY, 2, 0),
+                    trigger(TASK_TIME_TRIGGER_ONCE, 3, 0)};
+    writeTask(old);
     const std::string before = TempDir::read(taskPath());
     EXPECT_FALSE(m_helper.createScheduledTask(true));
     EXPECT_EQ(TempDir::read(taskPath()), before);

@@ -9,11 +9,11 @@
 #include "TaskSchedulerFaults.h"
 #include "TempDir.h"
 #include "TestText.h"
+#include "Triggers.h"
 #include "Win32Service.h"
 
 #include <gtest/gtest.h>
 
-#include <cstring>
 #include <vector>
 
 using namespace OnlineUpdateCommand_NS;
@@ -66,25 +66,17 @@ public:
     static TASK_TRIGGER trigger(TASK_TRIGGER_TYPE type, WORD hour, WORD minute, WORD year = 2024, WORD month = 3,
                                 WORD day = 14)
     {
-        TASK_TRIGGER t;
-        std::memset(&t, 0, sizeof t);
-        t.cbTriggerSize = sizeof(TASK_TRIGGER);
-        t.wBeginYear = year, t.wBeginMonth = month, t.wBeginDay = day, t.wStartHour = hour, t.wStartMinute = minute;
-        t.TriggerType = type;
-        t.Type.Daily.DaysInterval = 1; // in the place of a weekly trigger's WeeksInterval
-        return t;
+        return makeTrigger(hour, minute, 1, type, year, month, day);
     }
 
     // A task record as the helper writes it for the standard parameters.
     static TaskRecord goodRecord()
     {
-        return {kApp,
-                L"preparer",
-                user(),
-                L"",
-                TASK_FLAG_INTERACTIVE | TASK_FLAG_RUN_ONLY_IF_LOGGED_ON,
-                SCHED_S_TASK_HAS_NOT_RUN,
-                {trigger(TASK_TIME_TRIGGER_DAILY, 7, 5)}};
+        TaskRecord record;
+        record.applicationName = kApp, record.parameters = L"preparer", record.account = user();
+        record.flags = TASK_FLAG_INTERACTIVE | TASK_FLAG_RUN_ONLY_IF_LOGGED_ON;
+        record.triggers = {trigger(TASK_TIME_TRIGGER_DAILY, 7, 5)};
+        return record;
     }
 
     // Writes the task file directly, as the scheduler would, owned by `owner` (default: the user).

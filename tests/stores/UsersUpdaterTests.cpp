@@ -63,8 +63,9 @@ TEST_F(UsersUpdaterTest, CountsConsecutiveUsedSlotsAndAddsAfterThem)
     }
 }
 
-// Added one by one after removeAllUsers, users fill the slots in call order up to twenty; a
-// name "0" is written but leaves its slot free.
+// Added one by one after removeAllUsers, users fill the slots in call order up to twenty, the
+// limit; a name "0" is written but leaves its slot free. doesUserExist looks at all twenty slots,
+// matching exactly.
 TEST_F(UsersUpdaterTest, AddsUpToTwentyInCallOrder)
 {
     UsersUpdater& store = loaded(users({"Old1", "Old2", "Old3"}));
@@ -78,22 +79,14 @@ TEST_F(UsersUpdaterTest, AddsUpToTwentyInCallOrder)
     }
     EXPECT_EQ(utf8(store.getUserName(0) + store.getUserName(9) + store.getUserName(19)), "u1u10u20");
     ASSERT_TRUE(store.save());
-    EXPECT_EQ(reread().getUserCount(), 20u);
-}
-
-// The limit is twenty users; doesUserExist looks at all twenty slots, matching exactly.
-TEST_F(UsersUpdaterTest, TwentyUsersIsTheLimit)
-{
-    std::vector<std::string> names;
-    for (int n = 1; n <= 20; ++n)
-        names.push_back("user" + std::to_string(n));
-    UsersUpdater& store = loaded(users(names));
-    EXPECT_EQ(store.getUserCount(), 20u);
-    EXPECT_FALSE(store.addUser(L"Extra"_w, L"a"_w, L"p"_w));
-    EXPECT_EQ(utf8(store.getUserName(19) + store.getUserName(20) + store.getUserAddress(20) + store.getUserPhone(20)),
-              "user20");
-    EXPECT_TRUE(store.doesUserExist(L"user20"_w));
-    EXPECT_FALSE(store.doesUserExist(L"User1"_w) || store.doesUserExist(L""_w));
+    UsersUpdater& saved = reread();
+    m_log.clear();
+    EXPECT_EQ(saved.getUserCount(), 20u);
+    EXPECT_FALSE(saved.addUser(L"Extra"_w, L"a"_w, L"p"_w));
+    EXPECT_EQ(utf8(saved.getUserName(19) + saved.getUserName(20) + saved.getUserAddress(20) + saved.getUserPhone(20)),
+              "u20");
+    EXPECT_TRUE(saved.doesUserExist(L"u20"_w));
+    EXPECT_FALSE(saved.doesUserExist(L"U1"_w) || saved.doesUserExist(L""_w));
     EXPECT_EQ(m_log.messages(kWarning).size(), 5u); // one per refusal
 }
 

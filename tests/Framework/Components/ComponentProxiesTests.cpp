@@ -7,27 +7,13 @@
 #include "ProxyComponent.h"
 #include "SmartProxy.h"
 
-#include <QApplication>
 #include <QDialog>
 #include <QMessageBox>
 
-#include <memory>
 #include <thread>
 
 namespace
 {
-// One QApplication for the whole test program (widgets and the file watcher need it).
-int s_argc = 1;
-char s_name[] = "ComponentsTests";
-char* s_argv[] = {s_name, nullptr};
-struct ApplicationEnvironment : ::testing::Environment
-{
-    void SetUp() override { m_application = std::make_unique<QApplication>(s_argc, s_argv); }
-    void TearDown() override { m_application.reset(); }
-    std::unique_ptr<QApplication> m_application;
-};
-::testing::Environment* const s_environment = ::testing::AddGlobalTestEnvironment(new ApplicationEnvironment);
-
 // Without a registration, the component manager makes each component from the library its
 // identifier names, through the library's entry points.
 TEST_F(ComponentFixture, EachComponentIsMadeFromItsLibrary)

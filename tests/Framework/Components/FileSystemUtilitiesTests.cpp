@@ -13,6 +13,7 @@
 #include <algorithm>
 #include <filesystem>
 #include <functional>
+#include <tuple>
 #include <vector>
 
 namespace
@@ -84,24 +85,18 @@ TEST(IniFile, ReadsTheFirstValueOfAKeyInItsSectionOfTheLastOpening)
     ACE_WString value;
     EXPECT_EQ(ini.readAttribute(L"S"_w, L"first"_w, value), CIniFile::eFILE_NOT_OPENED);
     const int ok = CIniFile::eOK, none = CIniFile::eNO_SUCH_ATTRIBUTE, closed = CIniFile::eFILE_NOT_OPENED;
-    const struct
+    // mode, file, answer of the opening, of the read of S/first, of the read of B/other
+    const std::tuple<int, const char*, int, int, int> steps[] = {
+        {CIniFile::eREAD, "first.ini", ok, ok, none},
+        {CIniFile::eREAD, "broken.ini", CIniFile::ePARSE_ERROR, none, ok},
+        {CIniFile::eREAD, "absent.ini", closed, closed, closed},
+        {2, "first.ini", CIniFile::eBAD_MODE, closed, closed}};
+    for (const auto& [mode, file, opened, first, other] : steps)
     {
-        int mode;
-        const char* file;
-        int opened, first, other;
-    } steps[] = {{CIniFile::eREAD, "first.ini", ok, ok, none},
-                 {CIniFile::eREAD, "broken.ini", CIniFile::ePARSE_ERROR, none, ok},
-                 {CIniFile::eREAD, "absent.ini", closed, closed, closed},
-                 {2, "first.ini", CIniFile::eBAD_MODE, closed, closed}};
-    for (const auto& s : steps)
-    {
-        EXPECT_EQ(ini.openIniFile(s.mode, wide(dir.file(s.file))), s.opened) << s.file;
-        EXPECT_EQ(ini.readAttribute(L"S"_w, L"first"_w, value), s.first) << s.file;
-        EXPECT_EQ(ini.readAttribute(L"B"_w, L"other"_w, value), s.other) << s.file;
-        if (s.first == ok)
-        {
-            EXPECT_EQ(utf8(value), "1");
-        }
+        EXPECT_EQ(ini.openIniFile(mode, wide(dir.file(file))), opened) << file;
+        EXPECT_EQ(ini.readAttribute(L"S"_w, L"first"_w, value), first) << file;
+        EXPECT_EQ(ini.readAttribute(L"B"_w, L"other"_w, value), other) << file;
+        EXPECT_TRUE(first != ok || utf8(value) == "1") << utf8(value);
     }
 }
 }

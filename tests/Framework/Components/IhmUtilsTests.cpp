@@ -17,6 +17,7 @@
 #include <filesystem>
 #include <map>
 #include <thread>
+#include <tuple>
 
 namespace
 {
@@ -118,25 +119,22 @@ TEST(WidgetDecorator, AppliesKnownStylesOfTheStyleFileOnTheGuiThread)
     EXPECT_FALSE(decorator->setStyleSheetFile(qs(dir.file("broken.xml"))));
     EXPECT_EQ(decorator->styleSheet(QStringLiteral("Style84")), QStringLiteral("QDialog { color: red; }"));
     EXPECT_TRUE(decorator->styleSheet(QString()).isNull());
-    // marks: the widget's style mark, its child's, and its name (a widget without one takes the style's).
-    const struct
-    {
-        const char *style, *name;
-        bool recursive, known;
-        const char* marks;
-    } cases[] = {{"Style99", "", true, true, "Style99|Style99|Style99"},
-                 {"Style85", "kept", false, true, "Style85||kept"},
-                 {"Style999", "", true, false, "||"}};
-    for (const auto& c : cases)
+    // style, widget name, recursive, known, and the marks: the widget's style mark, its child's, and
+    // its name (a widget without one takes the style's)
+    const std::tuple<const char*, const char*, bool, bool, const char*> cases[] = {
+        {"Style99", "", true, true, "Style99|Style99|Style99"},
+        {"Style85", "kept", false, true, "Style85||kept"},
+        {"Style999", "", true, false, "||"}};
+    for (const auto& [style, name, recursive, known, marks] : cases)
     {
         QWidget widget;
         auto* child = new QPushButton(&widget);
-        widget.setObjectName(qs(c.name));
-        EXPECT_EQ(decorator->decorate(qs(c.style), widget, c.recursive), c.known) << c.style;
-        EXPECT_EQ(widget.styleSheet(), decorator->styleSheet(qs(c.style)));
+        widget.setObjectName(qs(name));
+        EXPECT_EQ(decorator->decorate(qs(style), widget, recursive), known) << style;
+        EXPECT_EQ(widget.styleSheet(), decorator->styleSheet(qs(style)));
         EXPECT_EQ(widget.property("decoratorStyle").toString() + "|" + child->property("decoratorStyle").toString() +
                       "|" + widget.objectName(),
-                  qs(c.marks));
+                  qs(marks));
     }
     QWidget widget;
     bool decorated = true;

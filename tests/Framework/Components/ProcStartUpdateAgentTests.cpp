@@ -11,6 +11,7 @@
 #include <filesystem>
 #include <future>
 #include <thread>
+#include <tuple>
 
 namespace
 {
@@ -61,19 +62,16 @@ TEST_F(UpdateAgentTest, AnswerIsMinusTheExitStatusOfTheAgent)
         ASSERT_EQ(check(), Agent::eOK);
         EXPECT_EQ(TempDir::read(record), "--check-configuration|" + file);
     }
-    const struct
+    // the agent's script, executable, the answer
+    const std::tuple<const char*, bool, int> cases[] = {
+        {"exit 40", true, -40}, // beyond the list: passed on as it comes
+        {"echo noise >&2; exit 2", true, Agent::eNOK_MISSING_CONFIGURATION_FILE},
+        {"kill -9 $$", true, Agent::eNOK_DISTRIBUTION_FOLDER_UNKNOWN_ERROR}, // no exit status to read
+        {"exit 0", false, Agent::eNOK_MISSING_UPDATE_AGENT}};
+    for (const auto& [script, executable, answer] : cases)
     {
-        const char* script;
-        bool executable;
-        int answer;
-    } cases[] = {{"exit 40", true, -40}, // beyond the list: passed on as it comes
-                 {"echo noise >&2; exit 2", true, Agent::eNOK_MISSING_CONFIGURATION_FILE},
-                 {"kill -9 $$", true, Agent::eNOK_DISTRIBUTION_FOLDER_UNKNOWN_ERROR}, // no exit status to read
-                 {"exit 0", false, Agent::eNOK_MISSING_UPDATE_AGENT}};
-    for (const auto& c : cases)
-    {
-        configureAgent(c.script, c.executable);
-        EXPECT_EQ(check(), c.answer) << c.script;
+        configureAgent(script, executable);
+        EXPECT_EQ(check(), answer) << script;
     }
     m_agent->setTimeoutMilliseconds(300);
     configureAgent("exec sleep 30");

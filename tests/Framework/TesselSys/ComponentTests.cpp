@@ -10,6 +10,7 @@
 #include <filesystem>
 #include <functional>
 #include <thread>
+#include <tuple>
 
 namespace
 {
@@ -108,12 +109,8 @@ TEST_F(ComponentManagerTest, RegistrationAndDestroyingAComponentOrphansOnlyItsPr
 TEST_F(ComponentManagerTest, ComponentOrProxyThatCannotBeMadeGivesCodeLogLineAndNoProxy)
 {
     ASSERT_EQ(add("test:Unit?NoProxy", [](IComponent*) -> ProxyComponent* { return nullptr; }), 0);
-    const struct
-    {
-        const char* id;
-        int result;
-        const char* logged;
-    } cases[] = {
+    // identifier, result, error line fragment ("": none)
+    const std::tuple<const char*, int, const char*> cases[] = {
         {"test:NoSuchLibraryQx?Any", IComponentManager::eLIBRARY_NOT_LOADED, "libNoSuchLibraryQx.so: cannot open"},
         {"test:../bin/TesselSys?Any", IComponentManager::eLIBRARY_NOT_LOADED, "is not a plain name"},
         {"test:TesselSys?Any", IComponentManager::eENTRY_POINT_MISSING, "lacks the entry point 'createComponent'"},
@@ -122,15 +119,15 @@ TEST_F(ComponentManagerTest, ComponentOrProxyThatCannotBeMadeGivesCodeLogLineAnd
         {"test:Unit?NoProxy", IComponentManager::ePROXY_NOT_CREATED, "no proxy made for 'test:Unit?NoProxy'"},
         {"", IComponentManager::eNULL_ARGUMENT, ""},
     };
-    for (const auto& c : cases)
+    for (const auto& [id, result, logged] : cases)
     {
-        SCOPED_TRACE(c.id);
+        SCOPED_TRACE(id);
         LogCapture log;
         ProxyComponent* proxy = nullptr;
-        EXPECT_EQ(m_manager->getProxy(ID(c.id), proxy), c.result);
+        EXPECT_EQ(m_manager->getProxy(ID(id), proxy), result);
         EXPECT_TRUE(proxy == nullptr && held() == 0);
-        EXPECT_EQ(log.containsSubstring(c.logged, TesselLog_Static::eERROR), *c.logged != '\0');
-        EXPECT_EQ(m_manager->getComponent(ID(c.id)) != nullptr, c.result == IComponentManager::ePROXY_NOT_CREATED);
+        EXPECT_EQ(log.containsSubstring(logged, TesselLog_Static::eERROR), *logged != '\0');
+        EXPECT_EQ(m_manager->getComponent(ID(id)) != nullptr, result == IComponentManager::ePROXY_NOT_CREATED);
     }
 
     // The base component's state names it, and its counts never go below zero.
